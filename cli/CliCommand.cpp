@@ -1,0 +1,54 @@
+#include "CliCommand.h"
+
+#include "Version.h"
+
+namespace Cli {
+
+namespace {
+
+void printHelp(QTextStream &out)
+{
+    out << "Usage: brindle-cli COMMAND [ARGUMENTS]\n"
+           "       brindle-cli --version | --help\n\n"
+           "Reads disks, partitions, volumes and disk images through Brindle's disk kernel.\n\n"
+           "Commands:\n";
+    for (const Command &c : commands()) {
+        QString head = QStringLiteral("  %1 %2").arg(QLatin1String(c.name), QLatin1String(c.usage));
+        out << head << "\n      " << c.summary << "\n";
+    }
+}
+
+} // namespace
+
+const QList<Command> &commands()
+{
+    static const QList<Command> table = {
+        // Commands register here, in the order --help lists them.
+    };
+    return table;
+}
+
+int run(const QStringList &args, Io &io)
+{
+    if (args.isEmpty()) {
+        printHelp(io.err);
+        return Usage;
+    }
+    const QString &first = args.first();
+    if (first == QLatin1String("--version") || first == QLatin1String("-version")) {
+        io.out << "brindle-cli " << versionText() << "\n";
+        return Ok;
+    }
+    if (first == QLatin1String("--help") || first == QLatin1String("-help") || first == QLatin1String("-h")) {
+        printHelp(io.out);
+        return Ok;
+    }
+    for (const Command &c : commands()) {
+        if (first == QLatin1String(c.name))
+            return c.run(args.mid(1), io);
+    }
+    io.err << "brindle-cli: unknown command '" << first << "' (see brindle-cli --help)\n";
+    return Usage;
+}
+
+} // namespace Cli
