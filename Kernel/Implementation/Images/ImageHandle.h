@@ -9,20 +9,12 @@
 #include <QStringList>
 #include <cstdint>
 
+#include "DeviceInfo.h"
+
 class cRoot;
 class cStorage;
 class CPlatformFile;
 
-// Image kinds and their display names (shared with the device descriptor).
-enum class ImageKind : std::uint32_t {
-    Device = 0,     // "Data Storage Device"
-    Raw = 1,        // "RAW Data (Binary) Disk Image"
-    Tarvo = 2,      // "Tarvo Disk Image"
-    VirtualPC = 3,  // "Virtual PC Disk Image"
-    VMWare = 4,     // "Virtual Machine (VMWare) Disk Image"
-    Fragmented = 5, // "Fragmented RAW Data Disk Image"
-    Backup = 6,     // "Tarvo Backup Image"
-};
 
 class CImageHandle
 {
