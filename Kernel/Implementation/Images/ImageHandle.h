@@ -9,7 +9,7 @@
 #include <QStringList>
 #include <cstdint>
 
-#include "DeviceInfo.h"
+#include "Implementation/DeviceInfo.h"
 
 class cRoot;
 class cStorage;
