@@ -1,0 +1,667 @@
+#include "PlatformFile.h"
+
+#include "DeviceControl.h"
+#include "PlatformOps.h"
+
+#include "../SystemError.h"
+#include "../cRoot.h"
+
+#include <QMutexLocker>
+
+#include <cstring>
+#include <map>
+#include <memory>
+
+namespace {
+
+const char *const kOperationTexts[] = {
+    "GetVersionEx",
+    "DeviceIoControl(IOCTL_DISK_GET_DRIVE_GEOMETRY)",
+    "DeviceIoControl(IOCTL_STORAGE_GET_DEVICE_NUMBER)",
+    "DeviceIoControl(IOCTL_DISK_GET_PARTITION_INFO)",
+    "DeviceIoControl(IOCTL_VOLUME_GET_VOLUME_DISK_EXTENTS)",
+    "DeviceIoControl(IOCTL_DISK_UPDATE_PROPERTIES)",
+    "DeviceIoControl(IOCTL_DISK_GET_DRIVE_LAYOUT_EX)",
+    "FindFirstVolume",
+    "FindNextVolume",
+    "FindVolumeClose",
+    "GetVolumeInformation",
+    "DeviceIoControl(FSCTL_LOCK_VOLUME)",
+    "DeviceIoControl(FSCTL_DISMOUNT_VOLUME)",
+    "DeviceIoControl(FSCTL_UNLOCK_VOLUME)",
+    "DeleteVolumeMountPoint",
+    "SetVolumeMountPoint",
+    "SetVolumeLabel",
+    "CreateFile",
+    "CreateFile",
+    "GetFileSizeEx",
+    "SetFilePointerEx",
+    "ReadFile",
+    "WriteFile",
+    "SetEndOfFile",
+    "CloseHandle",
+    "SetFileTime",
+    "SetFileAttributes",
+    "DeleteFile",
+    "MoveFile",
+    "CreateDirectory",
+};
+
+constexpr uint32_t kLayoutHeader = sizeof(DeviceControl::DRIVE_LAYOUT_INFORMATION_EX);
+constexpr uint32_t kLayoutEntry = sizeof(DeviceControl::PARTITION_INFORMATION_EX);
+constexpr uint32_t kLayoutSizes = 128;
+
+} // namespace
+
+QString PlatformOperationText(uint32_t operation)
+{
+    if (operation < std::size(kOperationTexts))
+        return QString::fromLatin1(kOperationTexts[operation]);
+    return QStringLiteral("Unknown 0x%1").arg(operation, 8, 16, QLatin1Char('0'));
+}
+
+CPlatformFile::CPlatformFile(cRoot *owner, const QString &name, PlatformKind kind)
+    : m_owner(owner), m_kind(kind), m_name(name)
+{
+}
+
+CPlatformFile::~CPlatformFile()
+{
+    QMutexLocker guard(&m_lock);
+    if (m_handle == NullPlatformHandle)
+        return;
+    Internal(QStringLiteral("Not closed handle %1").arg(m_name));
+    // A locked volume is left unlocked rather than leaking its handle.
+    uint32_t error = 0;
+    if (m_locked) {
+        uint32_t returned = 0;
+        Backend().DeviceControl(m_handle, DeviceControl::FSCTL_UNLOCK_VOLUME, nullptr, 0, nullptr, 0,
+                                returned, error);
+        m_locked = 0;
+    }
+    if (!Backend().Close(m_handle, error))
+        Record(PlatformOperation::CloseHandle, 0, 0, error);
+    m_handle = NullPlatformHandle;
+}
+
+IPlatformBackend &CPlatformFile::Backend() const
+{
+    return m_owner ? m_owner->Backend() : DefaultPlatformBackend();
+}
+
+void CPlatformFile::Internal(const QString &text) const
+{
+    if (m_owner)
+        m_owner->EmitInternal(text);
+}
+
+void CPlatformFile::Debug(uint32_t line, uint32_t level, const QString &text) const
+{
+    if (m_owner)
+        m_owner->EmitDebug(QStringLiteral(__FILE__), line, level, text);
+}
+
+void CPlatformFile::Record(PlatformOperation op, uint64_t position, uint64_t block, uint32_t error) const
+{
+    if (m_owner)
+        m_owner->EmitPlatform(static_cast<uint32_t>(op), m_name, position, block, error);
+}
+
+bool CPlatformFile::EnsureOpen()
+{
+    if (m_handle != NullPlatformHandle)
+        return true;
+    return Reopen(true);
+}
+
+QString CPlatformFile::GetName()
+{
+    QMutexLocker guard(&m_lock);
+    return m_name;
+}
+
+bool CPlatformFile::IsWritable()
+{
+    QMutexLocker guard(&m_lock);
+    if (!m_writable)
+        return false;
+    if (m_kind != PlatformKind::Device && m_kind != PlatformKind::Volume)
+        return true;
+    if (!DIOC(DeviceControl::IOCTL_DISK_IS_WRITABLE, nullptr, 0, nullptr, 0))
+        return m_error != SystemError::WriteProtect;
+    return true;
+}
+
+bool CPlatformFile::IsOpened()
+{
+    QMutexLocker guard(&m_lock);
+    return m_handle != NullPlatformHandle;
+}
+
+bool CPlatformFile::IsLocked()
+{
+    QMutexLocker guard(&m_lock);
+    return m_locked != 0;
+}
+
+bool CPlatformFile::Rename(const QString &newName)
+{
+    QMutexLocker guard(&m_lock);
+    if (m_handle != NullPlatformHandle) {
+        Internal(QStringLiteral("Attempt to rename non closed file %1").arg(m_name));
+        return false;
+    }
+    m_name = newName;
+    return true;
+}
+
+bool CPlatformFile::SetWritable(bool writable)
+{
+    QMutexLocker guard(&m_lock);
+    m_writable = writable ? 1 : 0;
+    return writable;
+}
+
+bool CPlatformFile::Create()
+{
+    QMutexLocker guard(&m_lock);
+    m_error = 0;
+    if (m_kind != PlatformKind::File) {
+        Internal(QStringLiteral("Attempt to create storage file %1").arg(m_name));
+        return false;
+    }
+    if (m_handle != NullPlatformHandle) {
+        Internal(QStringLiteral("Attempt to create non closed file %1").arg(m_name));
+        return false;
+    }
+    m_writable = 1;
+    uint32_t error = 0;
+    PlatformHandle h = Backend().Open(NativePath(m_name, Backend().Paths()), false, true, error);
+    if (h == NullPlatformHandle) {
+        m_error = error;
+        Record(PlatformOperation::CreateFileCreate, 0, 0, error);
+        return false;
+    }
+    m_handle = h;
+    Debug(__LINE__, 2, QStringLiteral("Create: ") + m_name);
+    return true;
+}
+
+bool CPlatformFile::Reopen(bool report)
+{
+    QMutexLocker guard(&m_lock);
+    m_error = 0;
+    if (m_handle != NullPlatformHandle) {
+        Internal(QStringLiteral("Attempt to reopen non closed file %1").arg(m_name));
+        return false;
+    }
+    IPlatformBackend &backend = Backend();
+    const QString path = m_kind == PlatformKind::File ? NativePath(m_name, backend.Paths()) : m_name;
+    uint32_t error = 0;
+    if (m_writable) {
+        PlatformHandle h = backend.Open(path, false, false, error);
+        if (h != NullPlatformHandle) {
+            m_handle = h;
+            if (m_kind == PlatformKind::Volume) {
+                uint32_t returned = 0, ignored = 0;
+                backend.DeviceControl(h, DeviceControl::FSCTL_ALLOW_EXTENDED_DASD_IO, nullptr, 0, nullptr, 0,
+                                      returned, ignored);
+            }
+        }
+    }
+    if (m_handle == NullPlatformHandle) {
+        PlatformHandle h = backend.Open(path, true, false, error);
+        if (h == NullPlatformHandle) {
+            m_error = error;
+            if (report)
+                Record(PlatformOperation::CreateFileOpen, 0, 0, error);
+            return false;
+        }
+        m_handle = h;
+        m_writable = 0;
+    }
+    Debug(__LINE__, 2, QStringLiteral("Open: ") + m_name);
+    return true;
+}
+
+bool CPlatformFile::GetSize(uint64_t &size)
+{
+    QMutexLocker guard(&m_lock);
+    size = 0;
+    m_error = 0;
+    if (m_kind != PlatformKind::File) {
+        Internal(QStringLiteral("Attempt to get size of storage file %1").arg(m_name));
+        return false;
+    }
+    if (!EnsureOpen())
+        return false;
+    uint32_t error = 0;
+    uint64_t value = 0;
+    if (!Backend().GetFileSize(m_handle, value, error)) {
+        m_error = error;
+        Record(PlatformOperation::GetFileSizeEx, 0, 0, error);
+        return false;
+    }
+    size = value;
+    return true;
+}
+
+bool CPlatformFile::Resize(uint64_t newSize)
+{
+    QMutexLocker guard(&m_lock);
+    m_error = 0;
+    if (m_kind != PlatformKind::File) {
+        Internal(QStringLiteral("Attempt to resize storage file %1").arg(m_name));
+        return false;
+    }
+    if (!EnsureOpen())
+        return false;
+    uint32_t error = 0;
+    uint64_t position = 0;
+    if (newSize > uint64_t(INT64_MAX) ||
+        !Backend().SetPosition(m_handle, int64_t(newSize), SeekOrigin::Begin, position, error)) {
+        m_error = error ? error : SystemError::InvalidParameter;
+        Record(PlatformOperation::SetFilePointerEx, newSize, 0, m_error);
+        return false;
+    }
+    if (!Backend().SetEndOfFile(m_handle, error)) {
+        m_error = error;
+        Record(PlatformOperation::SetEndOfFile, newSize, 0, error);
+        return false;
+    }
+    return true;
+}
+
+bool CPlatformFile::GetPosition(uint64_t &position)
+{
+    QMutexLocker guard(&m_lock);
+    m_error = 0;
+    if (m_lost) {
+        m_error = m_lost;
+        return false;
+    }
+    if (!EnsureOpen())
+        return false;
+    uint32_t error = 0;
+    if (!Backend().SetPosition(m_handle, 0, SeekOrigin::Current, position, error)) {
+        m_error = error;
+        Record(PlatformOperation::SetFilePointerEx, 0, 0, error);
+        return false;
+    }
+    return true;
+}
+
+bool CPlatformFile::Read(uint64_t pos, uint32_t size, void *buffer)
+{
+    QMutexLocker guard(&m_lock);
+    return ReadWrite(true, pos, size, buffer);
+}
+
+bool CPlatformFile::Write(uint64_t pos, uint32_t size, const void *buffer)
+{
+    QMutexLocker guard(&m_lock);
+    return ReadWrite(false, pos, size, const_cast<void *>(buffer));
+}
+
+// One transfer at the current position; a buffer not aligned to 4 bytes goes through a temporary one.
+bool CPlatformFile::Attempt(bool read, uint32_t size, void *buffer, uint32_t &done)
+{
+    IPlatformBackend &backend = Backend();
+    uint32_t error = 0;
+    done = 0;
+    bool ok;
+    if ((reinterpret_cast<std::uintptr_t>(buffer) & 3) == 0) {
+        ok = read ? backend.Read(m_handle, buffer, size, done, error)
+                  : backend.Write(m_handle, buffer, size, done, error);
+    } else {
+        std::unique_ptr<uint8_t[]> temp(new uint8_t[size ? size : 1]);
+        if (read) {
+            ok = backend.Read(m_handle, temp.get(), size, done, error);
+            if (ok)
+                std::memcpy(buffer, temp.get(), std::min(done, size));
+        } else {
+            std::memcpy(temp.get(), buffer, size);
+            ok = backend.Write(m_handle, temp.get(), size, done, error);
+        }
+    }
+    if (!ok)
+        m_error = error ? error : SystemError::GenFailure;
+    return ok;
+}
+
+bool CPlatformFile::ReadWrite(bool read, uint64_t pos, uint32_t size, void *buffer)
+{
+    QMutexLocker guard(&m_lock);
+    m_error = 0;
+    if (!EnsureOpen())
+        return false;
+    if (m_kind == PlatformKind::File && pos == CurrentPosition) {
+        if (!(read ? GetPosition(pos) : GetSize(pos)))
+            return false;
+        m_error = 0;
+    }
+    if (m_lost) {
+        m_error = m_lost;
+        return false;
+    }
+    const PlatformOperation op = read ? PlatformOperation::ReadFile : PlatformOperation::WriteFile;
+    IPlatformBackend &backend = Backend();
+    auto position = [&]() -> bool {
+        uint32_t error = 0;
+        uint64_t reached = 0;
+        if (pos > uint64_t(INT64_MAX) ||
+            !backend.SetPosition(m_handle, int64_t(pos), SeekOrigin::Begin, reached, error)) {
+            m_error = error ? error : SystemError::NegativeSeek;
+            Record(PlatformOperation::SetFilePointerEx, pos, size, m_error);
+            return false;
+        }
+        return true;
+    };
+    if (!position())
+        return false;
+
+    uint32_t attempts = 1;
+    if (m_kind == PlatformKind::Device || m_kind == PlatformKind::Volume)
+        attempts = m_owner ? m_owner->RetryCount(0) : 2;
+    if (attempts == 0)
+        attempts = 1;
+    bool reopened = false;
+    bool first = true;
+    for (;;) {
+        if (!first && !position())
+            return false;
+        first = false;
+        uint32_t done = 0;
+        if (Attempt(read, size, buffer, done)) {
+            if (done == size)
+                return true;
+            m_error = SystemError::HandleEof;
+            Record(op, pos, size, m_error);
+            return false;
+        }
+        const uint32_t error = m_error;
+        if (m_kind == PlatformKind::Volume && error == SystemError::MediaChanged && !reopened) {
+            reopened = true;
+            if (Close(false) && Reopen(true)) {
+                m_error = 0;
+                continue;
+            }
+            // The volume could not be opened again: the failure counts as an attempt.
+            if (m_handle == NullPlatformHandle) {
+                m_error = error;
+                Record(op, pos, size, error);
+                return false;
+            }
+            m_error = error;
+        }
+        if (!m_lost && ((m_kind == PlatformKind::Device &&
+                         (error == SystemError::FileNotFound || error == SystemError::DevNotExist)) ||
+                        (m_kind == PlatformKind::Volume && error == SystemError::FileInvalid))) {
+            m_lost = error;
+            return false;
+        }
+        if (--attempts == 0) {
+            Record(op, pos, size, error);
+            return false;
+        }
+    }
+}
+
+bool CPlatformFile::Flush(uint32_t &error)
+{
+    QMutexLocker guard(&m_lock);
+    if (m_kind == PlatformKind::File) {
+        Internal(QStringLiteral("Attempt to flush for file %1").arg(m_name));
+        error = 0;
+        return false;
+    }
+    if (m_lost) {
+        error = m_lost;
+        return false;
+    }
+    error = 0;
+    return true;
+}
+
+bool CPlatformFile::Lock()
+{
+    QMutexLocker guard(&m_lock);
+    m_error = 0;
+    if (m_kind != PlatformKind::Volume) {
+        Internal(QStringLiteral("Attempt to lock non volume handle %1").arg(m_name));
+        return false;
+    }
+    if (m_locked) {
+        Internal(QStringLiteral("Attempt to lock locked volume handle %1").arg(m_name));
+        return false;
+    }
+    if (!EnsureOpen())
+        return false;
+    if (!DIOC(DeviceControl::FSCTL_LOCK_VOLUME, nullptr, 0, nullptr, 0))
+        return false;
+    m_locked = 1;
+    return true;
+}
+
+bool CPlatformFile::Dismount(bool force)
+{
+    QMutexLocker guard(&m_lock);
+    m_error = 0;
+    if (m_kind != PlatformKind::Volume) {
+        Internal(QStringLiteral("Attempt to dismount non volume handle %1").arg(m_name));
+        return false;
+    }
+    if (!force) {
+        if (!m_locked) {
+            Internal(QStringLiteral("Attempt to dismount non locked volume handle %1").arg(m_name));
+            return false;
+        }
+        if (m_handle == NullPlatformHandle) {
+            m_error = SystemError::InvalidHandle;
+            return false;
+        }
+    } else if (!EnsureOpen()) {
+        return false;
+    }
+    if (!DIOC(DeviceControl::FSCTL_DISMOUNT_VOLUME, nullptr, 0, nullptr, 0))
+        return false;
+    if (force) {
+        // A forced dismount ends the lock with the handle.
+        if (m_locked) {
+            uint32_t returned = 0, error = 0;
+            Backend().DeviceControl(m_handle, DeviceControl::FSCTL_UNLOCK_VOLUME, nullptr, 0, nullptr, 0,
+                                    returned, error);
+            m_locked = 0;
+        }
+        return Close(false);
+    }
+    return true;
+}
+
+bool CPlatformFile::Unlock()
+{
+    QMutexLocker guard(&m_lock);
+    m_error = 0;
+    if (m_kind != PlatformKind::Volume) {
+        Internal(QStringLiteral("Attempt to unlock non volume handle %1").arg(m_name));
+        return false;
+    }
+    if (!m_locked) {
+        Internal(QStringLiteral("Attempt to unlock non locked volume handle %1").arg(m_name));
+        return false;
+    }
+    if (m_handle == NullPlatformHandle) {
+        m_error = SystemError::InvalidHandle;
+        return false;
+    }
+    if (!DIOC(DeviceControl::FSCTL_UNLOCK_VOLUME, nullptr, 0, nullptr, 0))
+        return false;
+    m_locked = 0;
+    return Close(false);
+}
+
+bool CPlatformFile::GetFreeSpace(uint64_t &freeBytes)
+{
+    QMutexLocker guard(&m_lock);
+    freeBytes = 0;
+    m_error = 0;
+    if (m_kind != PlatformKind::Volume) {
+        Internal(QStringLiteral("Attempt to get free space from non volume handle %1").arg(m_name));
+        return false;
+    }
+    IPlatformBackend &backend = Backend();
+    const QChar separator = backend.Paths() == PathStyle::Windows ? QLatin1Char('\\') : QLatin1Char('/');
+    QString path = m_name;
+    if (!path.endsWith(separator))
+        path += separator;
+    uint32_t error = 0;
+    uint64_t value = 0;
+    if (!backend.GetFreeSpace(NativePath(path, backend.Paths()), value, error)) {
+        m_error = error;
+        Record(PlatformOperation::GetFileSizeEx, 0, 0, error);
+        return false;
+    }
+    freeBytes = value;
+    return true;
+}
+
+bool CPlatformFile::Update()
+{
+    QMutexLocker guard(&m_lock);
+    m_error = 0;
+    if (m_kind != PlatformKind::Device) {
+        Internal(QStringLiteral("Attempt to updating non device handle %1").arg(m_name));
+        return false;
+    }
+    if (!EnsureOpen())
+        return false;
+    if (!DIOC(DeviceControl::IOCTL_DISK_UPDATE_PROPERTIES, nullptr, 0, nullptr, 0))
+        return false;
+    return Close(false);
+}
+
+bool CPlatformFile::GetLayoutInfo(QList<uint64_t> &offsets)
+{
+    QMutexLocker guard(&m_lock);
+    offsets.clear();
+    m_error = 0;
+    if (m_kind != PlatformKind::Device) {
+        Internal(QStringLiteral("Attempt to get layout info from non device handle %1").arg(m_name));
+        return false;
+    }
+    if (!EnsureOpen())
+        return false;
+    QByteArray buffer;
+    uint32_t returned = 0;
+    bool ok = false;
+    for (uint32_t n = 1; n <= kLayoutSizes; ++n) {
+        const uint32_t bufferSize = kLayoutHeader + n * kLayoutEntry;
+        buffer = QByteArray(int(bufferSize), '\0');
+        if (DIOC(DeviceControl::IOCTL_DISK_GET_DRIVE_LAYOUT_EX, nullptr, 0, buffer.data(), bufferSize,
+                 &returned)) {
+            ok = true;
+            break;
+        }
+        if (m_error != SystemError::InsufficientBuffer)
+            break;
+    }
+    if (!ok) {
+        Record(PlatformOperation::DiskGetDriveLayoutEx, 0, 0, m_error);
+        return false;
+    }
+    const uint32_t bufferSize = uint32_t(buffer.size());
+    DeviceControl::DRIVE_LAYOUT_INFORMATION_EX header;
+    std::memcpy(&header, buffer.constData(), sizeof(header));
+    if (returned != bufferSize || header.PartitionCount != (bufferSize - kLayoutHeader) / kLayoutEntry)
+        return false;
+    std::map<uint32_t, uint64_t> byNumber;
+    for (uint32_t i = 0; i < header.PartitionCount; ++i) {
+        DeviceControl::PARTITION_INFORMATION_EX entry;
+        std::memcpy(&entry, buffer.constData() + kLayoutHeader + i * kLayoutEntry, sizeof(entry));
+        if (entry.PartitionNumber == 0)
+            continue;
+        if (!byNumber.emplace(entry.PartitionNumber, uint64_t(entry.StartingOffset)).second)
+            return false;
+    }
+    for (const auto &[number, offset] : byNumber)
+        offsets.append(offset);
+    return true;
+}
+
+bool CPlatformFile::Close(bool deleteFile)
+{
+    QMutexLocker guard(&m_lock);
+    m_error = 0;
+    if (m_handle == NullPlatformHandle) {
+        Internal(QStringLiteral("Attempt to close non opened file %1").arg(m_name));
+        return false;
+    }
+    if (m_locked) {
+        Internal(QStringLiteral("Attempt to close locked volume %1").arg(m_name));
+        return false;
+    }
+    uint32_t error = 0;
+    if (!Backend().Close(m_handle, error)) {
+        m_error = error;
+        Record(PlatformOperation::CloseHandle, 0, 0, error);
+        return false;
+    }
+    m_writable = 1;
+    m_handle = NullPlatformHandle;
+    Debug(__LINE__, 3, QStringLiteral("Close: ") + m_name);
+    if (m_kind == PlatformKind::File && deleteFile) {
+        IPlatformBackend &backend = Backend();
+        if (!backend.DeleteFile(NativePath(m_name, backend.Paths()), error)) {
+            m_error = error;
+            Record(PlatformOperation::DeleteFile, 0, 0, error);
+            return false;
+        }
+    }
+    return true;
+}
+
+uint32_t CPlatformFile::GetError()
+{
+    QMutexLocker guard(&m_lock);
+    return m_error;
+}
+
+bool CPlatformFile::IsLost()
+{
+    QMutexLocker guard(&m_lock);
+    return m_lost != 0;
+}
+
+PlatformHandle CPlatformFile::GetHandle()
+{
+    QMutexLocker guard(&m_lock);
+    return m_handle;
+}
+
+bool CPlatformFile::DIOC(uint32_t code, const void *in, uint32_t inSize, void *out, uint32_t outSize,
+                         uint32_t *returned)
+{
+    QMutexLocker guard(&m_lock);
+    m_error = 0;
+    if (returned)
+        *returned = 0;
+    if (m_kind == PlatformKind::File) {
+        Internal(QStringLiteral("Attempt to DIOC for file %1").arg(m_name));
+        return false;
+    }
+    if (m_lost) {
+        m_error = m_lost;
+        return false;
+    }
+    if (!EnsureOpen())
+        return false;
+    uint32_t count = 0, error = 0;
+    const bool ok = Backend().DeviceControl(m_handle, code, in, inSize, out, outSize, count, error);
+    if (returned)
+        *returned = std::min(count, outSize);
+    if (!ok) {
+        m_error = error ? error : SystemError::GenFailure;
+        return false;
+    }
+    return true;
+}
