@@ -1,0 +1,3 @@
+#include "RootEnumSource.h"
+
+IEnumerationSource::~IEnumerationSource() = default;
