@@ -1,0 +1,92 @@
+#include "Application.h"
+
+#include "AppIdentity.h"
+#include "CLI/Arguments.h"
+#include "Log/ApplicationLog.h"
+#include "Settings/SettingsDocument.h"
+
+#include <QApplication>
+
+namespace Framework {
+
+namespace {
+Application *theApplication = nullptr;
+}
+
+Application::Application(int &argc, char **argv)
+    : m_owned(std::make_unique<QApplication>(argc, argv)), m_app(m_owned.get())
+{
+    open();
+}
+
+Application::Application(QApplication *existing) : m_app(existing)
+{
+    open();
+}
+
+Application::~Application()
+{
+    ApplicationLog::instance().close();
+    if (theApplication == this)
+        theApplication = nullptr;
+}
+
+Application *Application::instance()
+{
+    return theApplication;
+}
+
+void Application::open()
+{
+    theApplication = this;
+    auto &log = ApplicationLog::instance();
+    m_errorsAtStart = log.errorCount();
+    m_warningsAtStart = log.warningCount();
+    QCoreApplication::setApplicationName(Identity::ShortName);
+    QCoreApplication::setOrganizationName(Identity::OrganizationName);
+    QCoreApplication::setApplicationVersion(Identity::FileVersion);
+
+    auto &settings = SettingsDocument::instance();
+    settings.open(SettingsDocument::defaultPath());
+    log.load(settings.element(QStringLiteral("log")));
+    // The command line overrides the stored log options for this run.
+    log.overrideForRun(CLI::Arguments::flagValue(QStringLiteral("clearlog"), false),
+                       CLI::Arguments::isOptionSet(QStringLiteral("logpath"))
+                           ? CLI::Arguments::instance()->parser.value(QStringLiteral("logpath"))
+                           : QString());
+    log.start();
+}
+
+void Application::registerComponent(const QString &element, IPersistenceXML *component)
+{
+    m_components.append({element, component});
+    component->load(SettingsDocument::instance().element(element));
+}
+
+void Application::saveState()
+{
+    auto &settings = SettingsDocument::instance();
+    for (const auto &[name, component] : std::as_const(m_components)) {
+        QDomElement e = settings.element(name);
+        component->save(e, false);
+    }
+    settings.save();
+}
+
+void Application::initializationCompleted()
+{
+    ApplicationLog::instance().add(tr("Application initialization completed"));
+    emit initialized();
+}
+
+int Application::exitCode() const
+{
+    const auto &log = ApplicationLog::instance();
+    if (log.errorCount() > m_errorsAtStart)
+        return 1;
+    if (log.warningCount() > m_warningsAtStart)
+        return 2;
+    return 0;
+}
+
+} // namespace Framework
