@@ -1,14 +1,8 @@
 // The desktop program's entry point.
-#include <QApplication>
-#include <QMainWindow>
-
-#include "ClientFramework/AppIdentity.h"
+#include "Startup.h"
 
 int main(int argc, char **argv)
 {
-    QApplication app(argc, argv);
-    QMainWindow window;
-    window.setWindowTitle(Framework::Identity::FullName);
-    window.show();
-    return app.exec();
+    Solution::Startup startup;
+    return startup.run(argc, argv);
 }

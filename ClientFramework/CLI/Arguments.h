@@ -58,13 +58,13 @@ protected:
     void addOption(const QStringList &names, const QString &description, const QString &valueName = {},
                    const QString &defaultValue = {});
 
-private:
     // The reading helpers of this object.
     bool isSet(const QString &name) const;
     bool flag(const QString &name, bool defaultValue) const;
     int integer(const QString &name, int defaultValue) const;
     uint64_t offset(const QString &name, uint64_t defaultValue) const;
 
+private:
     QList<QCommandLineOption> m_options;
     bool m_parsed = false;
 };
