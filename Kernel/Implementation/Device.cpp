@@ -271,7 +271,7 @@ bool CDevice::Transfer(bool read, std::uint64_t first, std::uint32_t count, std:
             std::memset(buffer + std::uint64_t(n) * ss, 0, std::uint64_t(count - n) * ss);
     }
     if (n == 0)
-        return false;
+        return true; // nothing asked, nothing to do
 
     bool ok;
     if (m_info.partStyle == PartStyle::VirtualManager) {

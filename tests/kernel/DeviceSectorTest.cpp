@@ -10,6 +10,7 @@
 #include "DeviceFakeBackend.h"
 #include "Kernel/Implementation/Device.h"
 #include "Kernel/Implementation/DeviceVirtualSource.h"
+#include "Kernel/Implementation/Images/ImageHandle.h"
 #include "Kernel/Implementation/Platform/PlatformFile.h"
 #include "Kernel/Implementation/Root.h"
 
@@ -79,6 +80,8 @@ TEST_F(DeviceSectorTest, FirstSectorAtOrPastTheEndFailsWithoutTransfer)
     EXPECT_FALSE(d->ReadSectors(100, 1, buf.data(), error));
     EXPECT_FALSE(d->WriteSectors(1000, 1, buf.data(), error));
     EXPECT_EQ(error, 0u);
+    EXPECT_TRUE(backend.log.empty());
+    EXPECT_TRUE(d->ReadSectors(99, 0, buf.data(), error));
     EXPECT_TRUE(backend.log.empty());
 }
 
@@ -340,6 +343,94 @@ TEST_F(DeviceSectorTest, VirtualSourceServesReadsAndRefusesWrites)
     EXPECT_EQ(error, 2u);
     EXPECT_FALSE(v.WriteSectors(0, 1, buf.data(), error));
     EXPECT_EQ(error, 1u);
+}
+
+} // namespace
+
+namespace {
+
+// A sector store that records the requests it serves.
+class RecordingStorage : public cStorage
+{
+public:
+    std::vector<std::pair<std::uint64_t, std::uint32_t>> reads, writes;
+    StorageKind GetStorageKind() const override { return StorageKind::Raid; }
+    QString GetDisplayName() const override { return QStringLiteral("raid"); }
+    std::uint64_t GetSize() const override { return 50 * 512; }
+    std::uint32_t GetBytesPerSector() const override { return 512; }
+    std::uint64_t GetTotalSectors() const override { return 50; }
+    bool ReadSectors(std::uint64_t first, std::uint32_t count, void *buffer, std::uint32_t &error) override
+    {
+        reads.emplace_back(first, count);
+        std::memset(buffer, 0x3C, std::size_t(count) * 512);
+        error = 0;
+        return true;
+    }
+    bool WriteSectors(std::uint64_t first, std::uint32_t count, const void *, std::uint32_t &error) override
+    {
+        writes.emplace_back(first, count);
+        error = 31;
+        return false;
+    }
+    bool ReadBytes(std::uint64_t, std::uint64_t, void *, std::uint32_t &) override { return false; }
+    bool WriteBytes(std::uint64_t, std::uint64_t, const void *, std::uint32_t &) override { return false; }
+};
+
+class RecordingImage : public CImageHandle
+{
+public:
+    explicit RecordingImage(std::vector<std::pair<std::uint64_t, std::uint32_t>> &log)
+        : CImageHandle(nullptr, ImageKind::RawImage, 9), m_log(log)
+    {
+        m_totalSectors = 20;
+        m_writable = 1;
+    }
+    bool ReadWrite(bool read, std::uint64_t first, std::uint32_t count, void *buffer,
+                   std::uint32_t &error) override
+    {
+        m_log.emplace_back(first, count);
+        if (read)
+            std::memset(buffer, 0x77, std::size_t(count) * 512);
+        error = 0;
+        return true;
+    }
+
+private:
+    std::vector<std::pair<std::uint64_t, std::uint32_t>> &m_log;
+};
+
+TEST_F(DeviceSectorTest, RaidAndImageHandlesServeTheirDevices)
+{
+    DeviceInfo info;
+    info.totalSectors = 50;
+    info.mediaType = MediaType::RaidAssembly;
+    auto *raid = new RecordingStorage;
+    CDevice r(root.get(), info, nullptr, raid);
+    EXPECT_EQ(r.GetRaidIdentity(), raid);
+    std::vector<std::uint8_t> buf(4 * 512);
+    std::uint32_t error = 0;
+    ASSERT_TRUE(r.ReadSectors(48, 2, buf.data(), error));
+    EXPECT_FALSE(r.WriteSectors(1, 1, buf.data(), error));
+    EXPECT_EQ(error, 31u);
+    EXPECT_EQ(raid->reads, (std::vector<std::pair<std::uint64_t, std::uint32_t>>{{48, 2}}));
+    EXPECT_EQ(raid->writes.size(), 1u);
+
+    std::vector<std::pair<std::uint64_t, std::uint32_t>> log;
+    DeviceInfo imageInfo;
+    imageInfo.totalSectors = 20;
+    imageInfo.sub = 1;
+    CDevice im(root.get(), imageInfo, new RecordingImage(log));
+    EXPECT_TRUE(im.IsWritable());
+    log.clear();
+    EXPECT_FALSE(im.ReadSectors(18, 4, buf.data(), error)); // clipped to 2
+    EXPECT_EQ(log, (std::vector<std::pair<std::uint64_t, std::uint32_t>>{{18, 2}}));
+    EXPECT_EQ(buf[0], 0x77);
+    EXPECT_EQ(buf[3 * 512], 0);
+    std::uint8_t source = 9;
+    std::uint16_t number = 9;
+    QStringList files;
+    EXPECT_EQ(im.GetImageIdentity(source, number, files), 1);
+    EXPECT_EQ(r.GetImageIdentity(source, number, files), 0);
 }
 
 } // namespace
