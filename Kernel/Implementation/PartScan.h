@@ -31,6 +31,9 @@ struct Input
     PartStyle partStyle = PartStyle::Raw; // the descriptor's partition style
     EnumSource source = EnumSource::PhysicalDrive;
     bool ready = true;
+    // The device reads its own sectors (a platform, image or RAID handle). A volume-backed device
+    // without one is only the volume it carries.
+    bool ownSectors = true;
     QList<VolumeInfo> volumes; // the descriptor's platform volumes, matched to partitions
     // Internal messages, in the order raised.
     std::function<void(const QString &)> message;

@@ -1,0 +1,59 @@
+#include "MbrTable.h"
+
+#include <cstring>
+
+namespace Mbr {
+
+bool Entry::isZero() const
+{
+    for (std::uint8_t b : raw)
+        if (b != 0)
+            return false;
+    return true;
+}
+
+bool Entry::isValid() const
+{
+    if (start() == 0)
+        return isZero();
+    const std::uint16_t chsStart = static_cast<std::uint16_t>(raw[2] | raw[3] << 8);
+    const std::uint16_t chsEnd = static_cast<std::uint16_t>(raw[6] | raw[7] << 8);
+    return chsStart != 0 && type() != 0 && chsEnd != 0 && count() != 0;
+}
+
+Table parse(const QByteArray &sector)
+{
+    Table t;
+    if (sector.size() < 512)
+        return t;
+    const auto *p = reinterpret_cast<const std::uint8_t *>(sector.constData());
+    for (int i = 0; i < EntryCount; ++i)
+        std::memcpy(t.entries[i].raw.data(), p + EntryOffset + i * EntrySize, EntrySize);
+    t.diskSignature = p[440] | p[441] << 8 | p[442] << 16 | std::uint32_t(p[443]) << 24;
+    return t;
+}
+
+void sortEntries(QByteArray &sector)
+{
+    if (sector.size() < 512)
+        return;
+    auto *p = reinterpret_cast<std::uint8_t *>(sector.data()) + EntryOffset;
+    auto startOf = [p](int i) {
+        const std::uint8_t *e = p + i * EntrySize;
+        return e[8] | e[9] << 8 | e[10] << 16 | std::uint32_t(e[11]) << 24;
+    };
+    for (int i = 0; i < EntryCount - 1; ++i) {
+        int min = i;
+        for (int j = i + 1; j < EntryCount; ++j)
+            if (startOf(j) < startOf(min))
+                min = j;
+        if (min != i) {
+            std::uint8_t tmp[EntrySize];
+            std::memcpy(tmp, p + i * EntrySize, EntrySize);
+            std::memcpy(p + i * EntrySize, p + min * EntrySize, EntrySize);
+            std::memcpy(p + min * EntrySize, tmp, EntrySize);
+        }
+    }
+}
+
+} // namespace Mbr

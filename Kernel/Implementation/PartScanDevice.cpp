@@ -1,0 +1,31 @@
+// The device's side of the scan: its sectors, its descriptor, and the root's signals.
+#include "PartScan.h"
+
+#include "Device.h"
+#include "KernelEvents.h"
+#include "cRoot.h"
+
+namespace PartScan {
+
+Result ScanDevice(CDevice &device, const DeviceInfo &descriptor, cRoot *root)
+{
+    Input in;
+    in.storage = &device;
+    in.device = &device;
+    in.deviceName = device.GetDisplayName();
+    in.partStyle = descriptor.partStyle;
+    in.source = descriptor.source;
+    in.ready = descriptor.ready != 0;
+    in.ownSectors = descriptor.source != EnumSource::VolumeBacked || descriptor.handle != nullptr ||
+                    device.GetImageHandle() != nullptr;
+    in.volumes = descriptor.volumes;
+    if (root) {
+        in.message = [root](const QString &text) { root->EmitInternal(text); };
+        in.partitionMade = [root, &device](CPartition *) {
+            root->EmitStorage(&device, _event_storage::DeviceAdded, 0);
+        };
+    }
+    return Scan(in);
+}
+
+} // namespace PartScan

@@ -1,0 +1,30 @@
+// What the scan can tell about a partition's contents from its first sectors: the common boot
+// sectors and superblocks, enough to name a partition's kind before its volume is opened. The
+// volume layer's detection supersedes it.
+#pragma once
+
+#include <QByteArray>
+
+#include <cstdint>
+
+#include "cStorage.h"
+
+namespace PartScan {
+
+// The FileSystemKind code of a boot sector (NTFS, exFAT, FAT12/16, FAT32), else 0xFFFFFFFF.
+std::uint32_t bootSectorKind(const QByteArray &sector);
+
+// The FileSystemKind code found in the first sectors of the range (boot sectors, ext2/3/4, XFS,
+// Btrfs), else 0xFFFFFFFF. Reads at most 64 KiB + 4 KiB, never outside the range.
+std::uint32_t sniffFileSystem(cStorage &storage, std::uint64_t start, std::uint64_t length);
+
+// The kind a boot-record type byte alone decides (BSD 5, Storage Spaces 6), else 0xFFFFFFFF.
+std::uint32_t kindOfMbrType(std::uint8_t type);
+
+// Linux LVM2: "LABELONE" with "LVM2 001" at byte 24 in one of the first four sectors.
+bool hasLvm2Label(cStorage &storage);
+// ZFS: a vdev label with an uberblock (magic 0x00bab10c, either byte order) in one of the four
+// label places (256 KiB each; two at the start, two at the end of the device).
+bool hasZfsLabel(cStorage &storage);
+
+} // namespace PartScan
