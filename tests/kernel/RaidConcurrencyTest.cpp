@@ -11,6 +11,8 @@
 #include "Kernel/Implementation/RaidHandle.h"
 #include "RaidTestStorage.h"
 
+using namespace RaidTest;
+
 namespace {
 
 constexpr std::uint64_t All = cStorage::NoSector;

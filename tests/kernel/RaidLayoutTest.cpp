@@ -10,6 +10,8 @@
 #include "Kernel/Implementation/Partition.h"
 #include "Kernel/Implementation/RaidHandle.h"
 #include "RaidTestStorage.h"
+
+using namespace RaidTest;
 #include "TestUtil.h"
 
 namespace {

@@ -12,6 +12,8 @@
 #include "Kernel/Implementation/SystemError.h"
 #include "Kernel/Implementation/cStorage.h"
 
+namespace RaidTest {
+
 class TestStorage : public cStorage
 {
 public:
@@ -170,3 +172,5 @@ inline QByteArray ExpectedSectors(std::uint64_t first, std::uint32_t count, std:
         FillSector(reinterpret_cast<std::uint8_t *>(out.data()) + std::uint64_t(i) * size, first + i, size);
     return out;
 }
+
+} // namespace RaidTest
