@@ -1,5 +1,6 @@
 #include "CliCommand.h"
 
+#include "Devices.h"
 #include "Version.h"
 
 namespace Cli {
@@ -24,6 +25,7 @@ const QList<Command> &commands()
 {
     static const QList<Command> table = {
         // Commands register here, in the order --help lists them.
+        {"devices", "[--json]", "Lists the storage devices in kernel order.", &runDevices},
     };
     return table;
 }

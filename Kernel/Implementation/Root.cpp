@@ -235,9 +235,48 @@ void CRoot::DestroyRetired()
         delete d;
 }
 
+uint32_t CRoot::BaseAttributes(const DeviceInfo &info, PartStyle style)
+{
+    using namespace DeviceAttribute;
+    uint32_t flags = 0;
+    switch (info.mediaType) {
+    case MediaType::Floppy:
+        flags |= Floppy;
+        break;
+    case MediaType::CdRom:
+        flags |= CdDvd;
+        break;
+    case MediaType::Removable:
+        flags |= Removable;
+        break;
+    case MediaType::Fixed:
+        flags |= Fixed;
+        break;
+    default:
+        break;
+    }
+    if (info.source == EnumSource::VolumeBacked)
+        flags |= Virtual;
+    if (info.sub != 0)
+        flags |= DiskImage;
+    if (info.rotation == Rotation::SolidState)
+        flags |= Ssd;
+    if (!info.ready)
+        flags |= NotReady;
+    else if (style == PartStyle::Raw && info.sub == 0)
+        flags |= NotInitialized;
+    for (const VolumeInfo &v : info.volumes) {
+        if (v.mountPoint == QLatin1String("/"))
+            flags |= System;
+    }
+    return flags;
+}
+
 CDevice *CRoot::MakeDevice(const DeviceInfo &info)
 {
-    return new CDevice(this, info);
+    CDevice *device = new CDevice(this, info);
+    device->SetAttributes(device->GetAttributes() | BaseAttributes(info, device->GetPartStyle()));
+    return device;
 }
 
 bool CRoot::IsAnnounced(const CDevice *device)
@@ -306,22 +345,33 @@ bool CRoot::Refresh(bool full, const RefreshKinds &kinds)
     return true;
 }
 
-bool CRoot::RequestAdd(const QString &path)
+bool CRoot::QueueRequest(const std::function<bool(Thread_Init *)> &enqueue)
 {
     QMutexLocker guard(&m_threadMutex);
-    if (m_thread && m_thread->isRunning() && m_thread->RequestAdd(path))
+    if (m_thread && m_thread->isRunning() && enqueue(m_thread))
         return true;
-    Thread_Init *thread = EnsureThread(false, RefreshKinds());
-    if (!thread) {
-        // The running thread is on its way out: wait for it and start a new one.
+    // No thread, a finished one, or one on its way out: a new thread serves the request.
+    if (m_thread) {
         m_thread->wait();
         delete m_thread;
-        m_thread = new Thread_Init(this, false, RefreshKinds());
-        thread = m_thread;
     }
-    thread->RequestAdd(path);
-    thread->start(QThread::InheritPriority);
+    m_thread = new Thread_Init(this, false, RefreshKinds());
+    if (!enqueue(m_thread))
+        return false;
+    m_thread->start(QThread::InheritPriority);
     return true;
+}
+
+bool CRoot::RequestAdd(const QString &path)
+{
+    return QueueRequest([&path](Thread_Init *t) { return t->RequestAdd(path); });
+}
+
+bool CRoot::RequestDeviceRefresh(CDevice *device)
+{
+    if (!device)
+        return false;
+    return QueueRequest([device](Thread_Init *t) { return t->RequestRefresh(device); });
 }
 
 bool CRoot::IsEnumerating()

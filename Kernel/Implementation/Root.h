@@ -10,7 +10,9 @@
 #include <QString>
 #include <QStringList>
 
+#include <atomic>
 #include <cstdint>
+#include <functional>
 #include <memory>
 
 class CDevice;
@@ -87,8 +89,16 @@ public:
     // Waits for the enumeration thread to finish its work and delivers queued events.
     bool WaitForEnumeration(unsigned long timeoutMs = 300000);
     bool IsEnumerating();
+    // True once a refresh pass has completed.
+    bool HasRefreshed() const { return m_refreshed; }
     // Queues a path to be identified and added on the enumeration thread (started when idle).
     bool RequestAdd(const QString &path);
+    // Queues a known device to be identified again on the enumeration thread: events 2 and 3
+    // around it, and a device whose medium or geometry changed is replaced (events 4 and 1).
+    bool RequestDeviceRefresh(CDevice *device);
+
+    // The attribute bits that follow from a descriptor and the device's partition style.
+    static uint32_t BaseAttributes(const DeviceInfo &info, PartStyle style);
 
     // The 64-bit order key of a device: number, source, sub, then media type and rank.
     static uint64_t SortKey(const CDevice *device);
@@ -137,6 +147,7 @@ protected:
 private:
     void DestroyRetired();
     Thread_Init *EnsureThread(bool full, const RefreshKinds &kinds);
+    bool QueueRequest(const std::function<bool(Thread_Init *)> &enqueue);
 
     IPlatformBackend *m_backend = nullptr;
     IEnumerationSource *m_source = nullptr;
@@ -154,6 +165,7 @@ private:
     QList<CDevice *> m_devices;
     Thread_Init *m_thread = nullptr;
     QMutex m_threadMutex; // guards m_thread
+    std::atomic<bool> m_refreshed{false};
     QMutex m_listMutex;
     QMutex m_secondMutex;
 

@@ -21,6 +21,13 @@ bool IsPartitionable(EnumSource source)
     return source == EnumSource::PhysicalDrive || source == EnumSource::VolumeBacked;
 }
 
+// A control the platform does not offer is no failure of the device.
+bool IsUnsupported(uint32_t error)
+{
+    return error == SystemError::InvalidFunction || error == SystemError::NotSupported ||
+           error == SystemError::CallNotImplemented;
+}
+
 QString ReadyText(uint8_t ready)
 {
     return ready ? QStringLiteral("ready") : QStringLiteral("not");
@@ -150,12 +157,23 @@ bool CEnumerator::Identify(const EnumCandidate &c, DeviceInfo &info)
         info.physicalSectorShift = info.sectorShift;
     } else {
         uint32_t error = h->GetError();
-        Record(uint32_t(PlatformOperation::DiskGetDriveGeometry), name, error);
-        info.ready = 0;
-        info.notReadyReason = QStringLiteral("Error [%1]: %2")
-                                  .arg(error)
-                                  .arg(m_root ? m_root->Backend().ErrorText(error) : QString());
-        FillFromPlatform(c, info);
+        int shift = RootIdentity::SectorShift(c.logicalSectorSize);
+        if (c.sizeBytes && shift > 0) {
+            // The device is open and the platform's listing knows its size and sector size exactly:
+            // it is ready even where the platform answers no geometry control.
+            FillFromPlatform(c, info);
+            info.ready = 1;
+            geometryOk = true;
+        } else {
+            if (!IsUnsupported(error))
+                Record(uint32_t(PlatformOperation::DiskGetDriveGeometry), name, error);
+            info.ready = 0;
+            info.notReadyReason = QStringLiteral("Error [%1]: %2")
+                                      .arg(error)
+                                      .arg(m_root ? m_root->Backend().ErrorText(error) : QString());
+            Internal(QStringLiteral("Device=%1, Not Ready: %2").arg(name, info.notReadyReason));
+            FillFromPlatform(c, info);
+        }
     }
     if (c.source == EnumSource::Floppy) {
         h->Close(false);
@@ -183,10 +201,24 @@ bool CEnumerator::Identify(const EnumCandidate &c, DeviceInfo &info)
             if (IsPartitionable(c.source))
                 info.partStyle = PartStyle::Mbr;
         } else {
-            Record(uint32_t(PlatformOperation::DiskGetPartitionInfo), name, h->GetError());
+            if (!IsUnsupported(h->GetError()))
+                Record(uint32_t(PlatformOperation::DiskGetPartitionInfo), name, h->GetError());
             // The platform's own count of the device's bytes is exact where the queries fail.
             if (c.sizeBytes)
                 info.totalSectors = c.sizeBytes >> info.sectorShift;
+            // Without the platform's word on the table style, the first sector tells it: a
+            // protective entry (type 0xEE) marks a GUID table, anything else with the boot
+            // signature a master boot record (checked below).
+            if (IsPartitionable(c.source)) {
+                QByteArray sector(int(info.bytesPerSector()), '\0');
+                if (h->Read(0, uint32_t(sector.size()), sector.data())) {
+                    info.partStyle = PartStyle::Mbr;
+                    for (int entry = 0; entry < 4; ++entry) {
+                        if (uint8_t(sector[446 + entry * 16 + 4]) == 0xEE)
+                            info.partStyle = PartStyle::Gpt;
+                    }
+                }
+            }
         }
 
         // 4. A table style needs the boot signature in the first sector.

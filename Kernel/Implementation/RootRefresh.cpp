@@ -97,6 +97,7 @@ void CRoot::RunRefresh(bool full, const RefreshKinds &kinds)
         if (device)
             InsertDevice(device);
     }
+    m_refreshed = true;
     StorageEvent(nullptr, _event_storage::EnumerationCompleted);
 }
 

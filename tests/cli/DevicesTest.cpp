@@ -1,0 +1,160 @@
+// brindle-cli devices and the SOURCE resolver against loop devices attached here, compared with
+// blockdev; and the listing of a device the user has no rights to.
+#include <gtest/gtest.h>
+
+#include "Kernel/Implementation/Device.h"
+#include "Kernel/Implementation/Platform/PlatformFile.h"
+#include "Kernel/Implementation/Root.h"
+#include "TestUtil.h"
+#include "cli/Source.h"
+
+#include <QJsonArray>
+#include <QJsonDocument>
+#include <QJsonObject>
+#include <QTemporaryDir>
+
+namespace {
+
+class LoopGuard
+{
+public:
+    LoopGuard(const QString &image, const QStringList &options)
+    {
+        TestUtil::ToolResult r = TestUtil::run("losetup", options + QStringList{"-f", "--show", image});
+        if (r.exitCode == 0)
+            m_device = QString::fromUtf8(r.out).trimmed();
+    }
+    ~LoopGuard()
+    {
+        if (!m_device.isEmpty())
+            TestUtil::run("losetup", {"-d", m_device});
+    }
+    LoopGuard(const LoopGuard &) = delete;
+    LoopGuard &operator=(const LoopGuard &) = delete;
+    const QString &Device() const { return m_device; }
+
+private:
+    QString m_device;
+};
+
+qint64 Blockdev(const QString &option, const QString &device)
+{
+    TestUtil::ToolResult r = TestUtil::run("blockdev", {option, device});
+    return r.exitCode == 0 ? QString::fromUtf8(r.out).trimmed().toLongLong() : -1;
+}
+
+QJsonObject EntryFor(const QJsonArray &list, const QString &path)
+{
+    for (const QJsonValue &v : list) {
+        if (v.toObject().value("path").toString() == path)
+            return v.toObject();
+    }
+    return {};
+}
+
+} // namespace
+
+TEST(CliDevices, JsonMatchesBlockdevForLoopDevices)
+{
+    if (!TestUtil::canAttachLoop())
+        GTEST_SKIP() << "loop devices cannot be attached here (needs root and /dev/loop-control)";
+    QTemporaryDir dir;
+    ASSERT_TRUE(dir.isValid());
+    const QString image = dir.filePath("disk.img");
+    ASSERT_EQ(TestUtil::run("truncate", {"-s", "24M", image}).exitCode, 0);
+    LoopGuard plain(image, {});
+    LoopGuard big(image, {"-b", "4096"});
+    ASSERT_FALSE(plain.Device().isEmpty());
+    ASSERT_FALSE(big.Device().isEmpty());
+
+    TestUtil::ToolResult r = TestUtil::run(TestUtil::builtProgram("brindle-cli"), {"devices", "--json"});
+    ASSERT_EQ(r.exitCode, 0) << r.err.toStdString();
+    QJsonParseError error;
+    QJsonDocument doc = QJsonDocument::fromJson(r.out, &error);
+    ASSERT_EQ(error.error, QJsonParseError::NoError) << r.out.toStdString();
+    const QJsonArray list = doc.array();
+    for (const LoopGuard *loop : {&plain, &big}) {
+        SCOPED_TRACE(loop->Device().toStdString());
+        QJsonObject o = EntryFor(list, loop->Device());
+        ASSERT_FALSE(o.isEmpty()) << r.out.toStdString();
+        const QStringList keys = {"number",       "source",    "name",       "path",
+                                  "mediaType",    "partStyle", "sectorSize", "physicalSectorSize",
+                                  "totalSectors", "model",     "firmware",   "serial",
+                                  "rotation",     "attributes"};
+        EXPECT_EQ(o.keys().size(), keys.size());
+        for (const QString &k : keys)
+            EXPECT_TRUE(o.contains(k)) << k.toStdString();
+        const qint64 sectorSize = o.value("sectorSize").toInteger();
+        EXPECT_EQ(sectorSize, Blockdev("--getss", loop->Device()));
+        EXPECT_EQ(o.value("physicalSectorSize").toInteger(), Blockdev("--getpbsz", loop->Device()));
+        EXPECT_EQ(o.value("totalSectors").toInteger() * sectorSize, Blockdev("--getsize64", loop->Device()));
+        EXPECT_EQ(o.value("source").toInt(), 3);
+        EXPECT_EQ(o.value("mediaType").toString(), "Fixed Disk");
+        EXPECT_EQ(o.value("partStyle").toString(), "Raw (not partitioned)");
+        EXPECT_TRUE(o.value("attributes").toArray().contains(QJsonValue("Virtual")));
+    }
+    EXPECT_EQ(EntryFor(list, big.Device()).value("sectorSize").toInt(), 4096);
+
+    // Text output: one block per device, numbered in kernel order.
+    TestUtil::ToolResult text = TestUtil::run(TestUtil::builtProgram("brindle-cli"), {"devices"});
+    ASSERT_EQ(text.exitCode, 0);
+    EXPECT_TRUE(text.out.contains("disk:0  "));
+    EXPECT_TRUE(text.out.contains(plain.Device().toUtf8()));
+    EXPECT_TRUE(text.out.contains("image file: " + image.toUtf8()));
+
+    // Without rights the devices are still listed, as not ready, with the reason.
+    if (TestUtil::haveTool("setpriv")) {
+        TestUtil::ToolResult nobody =
+            TestUtil::run("setpriv", {"--reuid=65534", "--regid=65534", "--clear-groups",
+                                      TestUtil::builtProgram("brindle-cli"), "devices", "--json"});
+        if (nobody.exitCode == 0) {
+            QJsonObject o = EntryFor(QJsonDocument::fromJson(nobody.out).array(), plain.Device());
+            ASSERT_FALSE(o.isEmpty()) << nobody.out.toStdString();
+            EXPECT_TRUE(o.value("attributes").toArray().contains(QJsonValue("Not Ready")));
+            EXPECT_EQ(o.value("totalSectors").toInteger() * o.value("sectorSize").toInteger(),
+                      Blockdev("--getsize64", plain.Device()));
+            TestUtil::ToolResult why =
+                TestUtil::run("setpriv", {"--reuid=65534", "--regid=65534", "--clear-groups",
+                                          TestUtil::builtProgram("brindle-cli"), "devices"});
+            EXPECT_TRUE(why.out.contains("not ready: Error [5]")) << why.out.toStdString();
+        }
+    }
+}
+
+TEST(CliDevices, SourceResolver)
+{
+    CRoot root;
+    QString error;
+    EXPECT_EQ(Cli::resolveSource(root, "disk:x", error), nullptr);
+    EXPECT_TRUE(error.contains("not a number")) << error.toStdString();
+    EXPECT_EQ(Cli::resolveSource(root, "disk:65000", error), nullptr);
+    EXPECT_TRUE(error.contains("there is no device 65000")) << error.toStdString();
+    EXPECT_EQ(Cli::resolveSource(root, "/no/such/thing", error), nullptr);
+    EXPECT_TRUE(error.contains("no such device or file")) << error.toStdString();
+    QTemporaryDir dir;
+    const QString file = dir.filePath("plain.bin");
+    ASSERT_TRUE(TestUtil::writeFile(file, QByteArray(4096, 'x')));
+    if (!Cli::imageOpener()) {
+        EXPECT_EQ(Cli::resolveSource(root, file, error), nullptr);
+        EXPECT_TRUE(error.contains("not a storage device")) << error.toStdString();
+    }
+
+    if (!TestUtil::canAttachLoop())
+        GTEST_SKIP() << "loop devices cannot be attached here (needs root and /dev/loop-control)";
+    LoopGuard loop(file, {});
+    ASSERT_FALSE(loop.Device().isEmpty());
+    // A device path is identified and added once; disk:N names the same object afterwards.
+    CDevice *d = Cli::resolveSource(root, loop.Device(), error);
+    ASSERT_NE(d, nullptr) << error.toStdString();
+    EXPECT_EQ(d->GetSize(), 4096u);
+    EXPECT_EQ(Cli::resolveSource(root, loop.Device(), error), d);
+    CDevice *viaNumber = nullptr;
+    for (uint32_t i = 0; i < 256 && !viaNumber; ++i) {
+        CDevice *c = Cli::resolveSource(root, QStringLiteral("disk:%1").arg(i), error);
+        if (!c)
+            break;
+        if (c->GetHandle() && c->GetHandle()->GetName() == loop.Device())
+            viaNumber = c;
+    }
+    EXPECT_EQ(viaNumber, d);
+}
