@@ -5,6 +5,7 @@
 
 #include <QByteArray>
 #include <QList>
+#include <QRecursiveMutex>
 #include <QString>
 #include <QStringList>
 #include <cstdint>
@@ -14,7 +15,6 @@
 class cRoot;
 class cStorage;
 class CPlatformFile;
-
 
 class CImageHandle
 {
@@ -30,6 +30,9 @@ public:
     // leaves the file's system error in `error`; a format failure leaves error 0.
     virtual bool ReadWrite(bool read, std::uint64_t first, std::uint32_t count, void *buffer,
                            std::uint32_t &error) = 0;
+    // Fills what the image knows of its source disk into a device descriptor (geometry, model,
+    // serial); the base sets the sector shift and size only.
+    virtual void Describe(DeviceInfo &info) const;
 
     ImageKind GetKind() const { return m_kind; }
     std::uint8_t GetSectorShift() const { return m_sectorShift; }
@@ -63,6 +66,8 @@ protected:
     // Opens each name as a File handle (Reopen with report) and records the sizes; any failure
     // closes what was opened and leaves the handle without files. False on failure.
     bool OpenFiles(const QStringList &names);
+    // Opens one more file and appends it; false (nothing appended) when it cannot be opened.
+    bool AddFile(const QString &name);
     // Wraps a file found on a kernel volume in a read-only platform file.
     bool OpenKernelFile(cStorage *source, const QString &name);
     // Takes over an already-open file (appended to the list; the handle owns it).
@@ -90,6 +95,8 @@ protected:
     std::uint8_t m_writable = 0;
     std::uint64_t m_totalSectors = 0;
     QString m_problem;
+    // Serialises transfers and the format's caches (several threads may share a device).
+    mutable QRecursiveMutex m_lock;
 
 private:
     QList<std::uint64_t> m_fileSizes;
