@@ -1,6 +1,7 @@
 #include "CliCommand.h"
 
 #include "Devices.h"
+#include "HwInfo.h"
 #include "Version.h"
 
 namespace Cli {
@@ -25,6 +26,7 @@ const QList<Command> &commands()
 {
     static const QList<Command> table = {
         // Commands register here, in the order --help lists them.
+        {"hwinfo", "FILE", "Writes the hardware-information report of this machine as XML.", &runHwInfo},
         {"devices", "[--json]", "Lists the storage devices in kernel order.", &runDevices},
     };
     return table;
