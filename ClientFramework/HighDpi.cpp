@@ -57,8 +57,9 @@ std::optional<double> x11Dpi()
                     dpi = v;
             }
         }
-        if (!dpi && screen->width_in_millimeters > 0)
-            dpi = screen->width_in_pixels * 25.4 / screen->width_in_millimeters;
+        // Without the resource the effective DPI of an X display is 96, whatever its physical size.
+        if (!dpi)
+            dpi = 96.0;
     }
     xcb_disconnect(c);
     return dpi;

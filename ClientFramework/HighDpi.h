@@ -10,8 +10,8 @@ namespace Framework {
 bool decideHighDpi(std::optional<double> primaryDpi, bool noHiDpi);
 
 // The primary screen's DPI as the platform reports it before any application object exists:
-// a forced font DPI (QT_FONT_DPI) first, then on X11 the "Xft.dpi" resource and else the screen's
-// pixel and millimetre sizes. Nothing when the platform tells nothing (no X display, Wayland).
+// a forced font DPI (QT_FONT_DPI) first, then on X11 the effective DPI ("Xft.dpi", else 96).
+// Nothing when the platform tells nothing (no X display, Wayland).
 std::optional<double> primaryScreenDpi();
 
 // Applies the decision for the application object about to be created: scaling off makes Qt keep

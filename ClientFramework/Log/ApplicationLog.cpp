@@ -140,10 +140,9 @@ void ApplicationLog::start()
     const bool createNew = (m_options & CreateNew) || m_runClear;
     QIODevice::OpenMode mode = QIODevice::WriteOnly | QIODevice::Text;
     mode |= (QFileInfo::exists(path) && !createNew) ? QIODevice::Append : QIODevice::Truncate;
-    m_started = true;
-    const QStringList pending = std::exchange(m_pendingLines, {});
     if (!m_file.open(mode))
         return; // the log stays in memory only
+    const QStringList pending = std::exchange(m_pendingLines, {});
     writeRaw(QStringLiteral("\n") +
              startBanner(QLocale::system().toString(QDateTime::currentDateTime(), QLocale::LongFormat)) +
              QLatin1Char('\n'));
@@ -210,7 +209,7 @@ void ApplicationLog::writeEntry(const LogEntry *entry)
         return;
     if (m_file.isOpen())
         writeRaw(entry->line() + QLatin1Char('\n'));
-    else if (!m_started)
+    else if (m_pendingLines.size() < MaxPendingLines)
         m_pendingLines.append(entry->line());
 }
 

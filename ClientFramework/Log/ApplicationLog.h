@@ -97,8 +97,9 @@ private:
     int m_warnings = 0;
 
     QFile m_file;
-    bool m_started = false;     // start() ran once: entries are no longer kept back for the file
-    QStringList m_pendingLines; // lines logged before the file was started
+    // Lines logged while no file is open, written when one opens (the first ones, up to a bound).
+    static constexpr int MaxPendingLines = 4096;
+    QStringList m_pendingLines;
     uint32_t m_options = DefaultOptions;
     QString m_fileName;
     QString m_folder;
