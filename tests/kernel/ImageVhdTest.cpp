@@ -7,7 +7,6 @@
 #include "Implementation/Images/ImageHandleVirtualPC.h"
 #include "Implementation/Images/ImageOpen.h"
 
-#include <QFile>
 #include <QTemporaryDir>
 
 #include <gtest/gtest.h>
@@ -45,14 +44,6 @@ protected:
     QTemporaryDir dir;
     RecordingRoot root;
 };
-
-void patch(const QString &path, qint64 offset, const QByteArray &bytes)
-{
-    QFile f(path);
-    ASSERT_TRUE(f.open(QIODevice::ReadWrite));
-    ASSERT_TRUE(f.seek(offset));
-    ASSERT_EQ(f.write(bytes), bytes.size());
-}
 
 } // namespace
 
@@ -127,8 +118,9 @@ TEST_F(ImageVhd, DynamicWritesAllocateBlocksThatQemuReads)
     // vpc has no consistency check in qemu-img (exit 63); anything else must be clean.
     EXPECT_TRUE(check.exitCode == 0 || check.exitCode == 63) << check.err.constData();
     auto info = TestUtil::run("vhdiinfo", {vhd});
-    if (info.exitCode != -1)
+    if (info.exitCode != -1) {
         EXPECT_EQ(info.exitCode, 0) << info.out.constData();
+    }
 
     // Reopened, the image is still writable and reads the same.
     CImageHandle_VirtualPC again(&root, {vhd});
@@ -217,10 +209,11 @@ TEST_F(ImageVhd, DamagedFieldsAreRefused)
         // Opened by content, such a file is a VHD refused, or (without its cookie) a raw image.
         QString problem;
         auto opened = ImageOpen::CreateHandle(&root, path, problem);
-        if (opened)
+        if (opened) {
             EXPECT_EQ(opened->GetKind(), ImageKind::RawImage) << d.what;
-        else
+        } else {
             EXPECT_FALSE(problem.isEmpty());
+        }
     }
     (void)footer;
     // A table entry that points past the end fails that read only, and the image is read-only.
