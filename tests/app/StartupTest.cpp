@@ -9,6 +9,7 @@
 
 #include <QApplication>
 #include <QDir>
+#include <QFile>
 #include <QSharedMemory>
 #include <QTimer>
 #include <QUuid>
@@ -19,11 +20,11 @@ namespace {
 class StartupTest : public ::testing::Test
 {
 protected:
-    int run(std::initializer_list<const char *> rest, bool loop = false)
+    int run(std::initializer_list<QByteArray> rest, bool loop = false)
     {
         QStringList args{QStringLiteral("brindle")};
-        for (const char *a : rest)
-            args << QString::fromLatin1(a);
+        for (const QByteArray &a : rest)
+            args << QString::fromLocal8Bit(a);
         Solution::Startup::Options o;
         o.application = qApp;
         o.instanceKey = key;
@@ -157,4 +158,19 @@ TEST_F(StartupTest, RunWithDiskRequestEndsWithErrorCode)
     EXPECT_TRUE(log.trimmed().endsWith("  Application Log Closed"));
     const QByteArray xml = TestUtil::readFile(settingsPath());
     EXPECT_TRUE(xml.contains("<main-view")) << xml.constData();
+}
+
+TEST_F(StartupTest, LogPathAndClearLogOverrideForTheRun)
+{
+    const QString own = home.file("elsewhere/run.log");
+    EXPECT_EQ(run({"-logpath=" + own.toLocal8Bit()}), 0);
+    EXPECT_TRUE(QString::fromUtf8(TestUtil::readFile(own)).contains("Initializing..."));
+    EXPECT_FALSE(QFile::exists(logPath())); // the stored file is not used for this run
+    // Not saved without "preserve".
+    EXPECT_FALSE(TestUtil::readFile(settingsPath()).contains("run.log"));
+
+    EXPECT_EQ(run({"-logpath=" + own.toLocal8Bit()}), 0);
+    EXPECT_EQ(QString::fromUtf8(TestUtil::readFile(own)).count("Application Log Started"), 2);
+    EXPECT_EQ(run({"-cl", "-lp=" + own.toLocal8Bit()}), 0);
+    EXPECT_EQ(QString::fromUtf8(TestUtil::readFile(own)).count("Application Log Started"), 1);
 }
