@@ -4,6 +4,7 @@
 
 #include "ClientFramework/GenericError.h"
 #include "ClientFramework/HighDpi.h"
+#include "ClientFramework/Privileges.h"
 #include "ClientFramework/SingleInstanceGuard.h"
 
 #include <QUuid>
@@ -92,4 +93,11 @@ TEST(GenericError, SeverityDecidesBoxAndLogLevel)
     EXPECT_EQ(dialogs.calls[2].title, "Error");
     EXPECT_EQ(watch.texts().size(), 5);
     EXPECT_STREQ(GenericError("text", 0).what(), "text");
+}
+
+TEST(Privileges, RootHasAdministratorRights)
+{
+    if (geteuid() != 0)
+        GTEST_SKIP() << "not running as root";
+    EXPECT_TRUE(hasAdministratorRights());
 }
