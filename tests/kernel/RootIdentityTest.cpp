@@ -3,6 +3,7 @@
 #include <gtest/gtest.h>
 
 #include "Kernel/Implementation/RootIdentity.h"
+#include "Kernel/Implementation/RootStatus.h"
 #include "RootTestSupport.h"
 
 #include <cstring>
@@ -149,4 +150,24 @@ TEST(RootIdentity, ManagementSerialAndSectorSizes)
     EXPECT_EQ(SectorShift(4096), 12);
     EXPECT_EQ(SectorShift(520), -1);
     EXPECT_EQ(SectorShift(8192), -1);
+}
+
+TEST(RootIdentity, StatusAndEventTexts)
+{
+    EXPECT_EQ(KernelStatus::Text(0, 0, QString()), QStringLiteral("Valid"));
+    // The system text loses its line breaks.
+    EXPECT_EQ(KernelStatus::Text(6, 23, QStringLiteral("Data error\r\n(cyclic redundancy check)\r\n")),
+              QStringLiteral("Error reading device (Data error (cyclic redundancy check))"));
+    EXPECT_EQ(KernelStatus::Text(28, 0, QString()),
+              QStringLiteral(
+                  "Partition has been created, however for some reason still cannot be found on a device"));
+    EXPECT_EQ(KernelStatus::Text(29, 0, QStringLiteral("x")), QStringLiteral("Unknown status"));
+    EXPECT_EQ(KernelStatus::Text(99, 5, QStringLiteral("Access is denied.")),
+              QStringLiteral("Unknown status (Access is denied.)"));
+    EXPECT_EQ(StorageEventText(1, QStringLiteral("Disk sda")),
+              QStringLiteral("Data storage detected Disk sda"));
+    EXPECT_EQ(StorageEventText(4, QStringLiteral("Disk sda")), QStringLiteral("Storage removed Disk sda"));
+    EXPECT_EQ(StorageEventText(0, QString()), QStringLiteral("Accessing local devices..."));
+    EXPECT_EQ(StorageEventText(5, QString()), QStringLiteral("Local devices enumeration completed"));
+    EXPECT_TRUE(StorageEventText(2, QStringLiteral("x")).isEmpty());
 }
