@@ -12,7 +12,11 @@
 #include "ClientFramework/GenericError.h"
 #include "ClientFramework/HighDpi.h"
 #include "ClientFramework/Log/ApplicationLog.h"
+#include "ClientFramework/Log/KernelLog.h"
 #include "ClientFramework/Settings/SettingsDocument.h"
+
+#include "Kernel/Implementation/KernelVersion.h"
+#include "Kernel/Implementation/Root.h"
 
 #include <QApplication>
 #include <QDateTime>
@@ -63,6 +67,7 @@ int Startup::run(const QStringList &argumentList, int &argc, char **argv)
     std::unique_ptr<CLI::NoKernelHost> host;
     std::unique_ptr<Framework::Application> application;
     std::unique_ptr<Framework::SingleInstanceGuard> guard;
+    std::unique_ptr<CRoot> root;
     std::unique_ptr<Solution::Commander> commander;
     std::unique_ptr<MainView> mainView;
     try {
@@ -114,6 +119,10 @@ int Startup::run(const QStringList &argumentList, int &argc, char **argv)
             arguments->save(root, true);
         }
 
+        // The disk kernel root: its records reach the log; devices are enumerated on request.
+        root = std::make_unique<CRoot>();
+        Framework::KernelLog::connect(root.get());
+
         commander = std::make_unique<Solution::Commander>();
         mainView = std::make_unique<MainView>(commander.get());
 
@@ -132,7 +141,8 @@ int Startup::run(const QStringList &argumentList, int &argc, char **argv)
 
         log.add(
             tr("Default working location set to '%1'").arg(QDir::toNativeSeparators(QDir::currentPath())));
-        logVersion(tr("pending..."));
+        const QString kernelVersion = Kernel::version();
+        logVersion(!root ? tr("pending...") : kernelVersion.isEmpty() ? tr("Undefined") : kernelVersion);
 
         int code = 0;
         if (m_options.runEventLoop)
