@@ -2,6 +2,7 @@
 
 #include "Devices.h"
 #include "HwInfo.h"
+#include "Read.h"
 #include "Version.h"
 
 namespace Cli {
@@ -28,6 +29,7 @@ const QList<Command> &commands()
         // Commands register here, in the order --help lists them.
         {"hwinfo", "FILE", "Writes the hardware-information report of this machine as XML.", &runHwInfo},
         {"devices", "[--json]", "Lists the storage devices in kernel order.", &runDevices},
+        {"read", "SOURCE --offset N --length N [--raw]", "Prints bytes of a device as a hex dump, or raw.", &runRead},
     };
     return table;
 }
