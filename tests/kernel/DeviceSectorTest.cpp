@@ -2,10 +2,12 @@
 // in-memory back end that logs every transfer.
 #include <gtest/gtest.h>
 
+#include <atomic>
 #include <cstring>
 #include <memory>
 #include <random>
 #include <set>
+#include <thread>
 
 #include "DeviceFakeBackend.h"
 #include "Kernel/Implementation/Device.h"
@@ -431,6 +433,34 @@ TEST_F(DeviceSectorTest, RaidAndImageHandlesServeTheirDevices)
     QStringList files;
     EXPECT_EQ(im.GetImageIdentity(source, number, files), 1);
     EXPECT_EQ(r.GetImageIdentity(source, number, files), 0);
+}
+
+} // namespace
+
+namespace {
+
+TEST_F(DeviceSectorTest, ByteReadsFromSeveralThreadsShareTheSectorBufferSafely)
+{
+    auto d = makeDevice(64);
+    const std::vector<std::uint8_t> expect = disk();
+    std::atomic<int> mismatches{0};
+    std::vector<std::thread> threads;
+    for (unsigned t = 0; t < 4; ++t) {
+        threads.emplace_back([&, t] {
+            std::mt19937 rng(t);
+            std::uint8_t buf[700];
+            for (int i = 0; i < 400; ++i) {
+                const std::uint64_t off = rng() % (64 * 512 - 700);
+                const std::uint64_t len = 1 + rng() % 700;
+                std::uint32_t error = 0;
+                if (!d->ReadBytes(off, len, buf, error) || std::memcmp(buf, expect.data() + off, len) != 0)
+                    ++mismatches;
+            }
+        });
+    }
+    for (auto &th : threads)
+        th.join();
+    EXPECT_EQ(mismatches.load(), 0);
 }
 
 } // namespace
