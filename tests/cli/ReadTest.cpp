@@ -96,3 +96,27 @@ TEST(CliRead, BytesEqualDdAtAnyOffset)
 }
 
 } // namespace
+
+namespace {
+
+TEST(CliRead, ImageFileSourceReadsTheVirtualDisk)
+{
+    if (!TestUtil::haveTool("qemu-img"))
+        GTEST_SKIP() << "qemu-img is not installed";
+    QTemporaryDir dir;
+    QByteArray data(1 << 20, 0);
+    std::mt19937 rng(9);
+    for (auto &c : data)
+        c = char(rng());
+    ASSERT_TRUE(TestUtil::writeFile(dir.filePath("raw.bin"), data));
+    auto conv = TestUtil::run("qemu-img", {"convert", "-O", "vpc", "-o", "subformat=dynamic",
+                                           dir.filePath("raw.bin"), dir.filePath("disk.vhd")});
+    ASSERT_EQ(conv.exitCode, 0) << conv.err.toStdString();
+    auto out =
+        TestUtil::run(TestUtil::builtProgram("brindle-cli"),
+                      {"read", dir.filePath("disk.vhd"), "--offset", "1000", "--length", "3000", "--raw"});
+    EXPECT_EQ(out.exitCode, 0) << out.err.toStdString();
+    EXPECT_EQ(out.out, data.mid(1000, 3000));
+}
+
+} // namespace
