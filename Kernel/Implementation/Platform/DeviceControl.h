@@ -274,6 +274,80 @@ struct ATA_PASS_THROUGH_EX
 };
 static_assert(sizeof(ATA_PASS_THROUGH_EX) == 48);
 
+// IOCTL_SCSI_PASS_THROUGH (buffered: the data lies in the request at DataBufferOffset) and
+// IOCTL_SCSI_PASS_THROUGH_DIRECT (DataBuffer is the address of the caller's data), the 64-bit layout.
+struct SCSI_PASS_THROUGH
+{
+    uint16_t Length;
+    uint8_t ScsiStatus;
+    uint8_t PathId;
+    uint8_t TargetId;
+    uint8_t Lun;
+    uint8_t CdbLength;
+    uint8_t SenseInfoLength;
+    uint8_t DataIn; // 0 out, 1 in, 2 none
+    uint8_t pad0[3];
+    uint32_t DataTransferLength;
+    uint32_t TimeOutValue;
+    uint32_t pad1;
+    uint64_t DataBufferOffset; // the data's address for the direct form
+    uint32_t SenseInfoOffset;
+    uint8_t Cdb[16];
+    uint8_t pad2[4];
+};
+static_assert(sizeof(SCSI_PASS_THROUGH) == 56);
+
+inline constexpr uint8_t SCSI_IOCTL_DATA_OUT = 0;
+inline constexpr uint8_t SCSI_IOCTL_DATA_IN = 1;
+inline constexpr uint8_t SCSI_IOCTL_DATA_UNSPECIFIED = 2;
+
+// SMART_GET_VERSION answer.
+struct GETVERSIONINPARAMS
+{
+    uint8_t bVersion;
+    uint8_t bRevision;
+    uint8_t bReserved;
+    uint8_t bIDEDeviceMap;
+    uint32_t fCapabilities;
+    uint32_t dwReserved[4];
+};
+static_assert(sizeof(GETVERSIONINPARAMS) == 24);
+
+// Registers of a SMART request: features, sector count, LBA low, mid, high, device, command.
+struct IDEREGS
+{
+    uint8_t bFeaturesReg;
+    uint8_t bSectorCountReg;
+    uint8_t bSectorNumberReg;
+    uint8_t bCylLowReg;
+    uint8_t bCylHighReg;
+    uint8_t bDriveHeadReg;
+    uint8_t bCommandReg;
+    uint8_t bReserved;
+};
+
+// SMART_RCV_DRIVE_DATA / SMART_SEND_DRIVE_COMMAND request (32 bytes before the buffer).
+struct SENDCMDINPARAMS
+{
+    uint32_t cBufferSize;
+    IDEREGS irDriveRegs;
+    uint8_t bDriveNumber;
+    uint8_t bReserved[3];
+    uint32_t dwReserved[4];
+};
+static_assert(sizeof(SENDCMDINPARAMS) == 32);
+
+// SMART answer: 16 bytes, then the 512-byte sector of data commands.
+struct SENDCMDOUTPARAMS
+{
+    uint32_t cBufferSize;
+    uint8_t bDriverError;
+    uint8_t bIDEError;
+    uint8_t bReserved[2];
+    uint32_t dwReserved[2];
+};
+static_assert(sizeof(SENDCMDOUTPARAMS) == 16);
+
 #pragma pack(pop)
 
 } // namespace DeviceControl

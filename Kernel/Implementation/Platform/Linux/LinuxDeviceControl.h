@@ -16,6 +16,11 @@ public:
              uint32_t &error);
 
 private:
+    uint32_t Answer(uint32_t code, const void *in, uint32_t inSize, void *out, uint32_t outSize,
+                    uint32_t &returned);
+    uint32_t Lock();
+    uint32_t Unlock();
+
     LinuxBackend &m_backend;
     int m_fd;
     PlatformHandle m_handle;
