@@ -1,6 +1,7 @@
 #include "Root.h"
 
 #include "Device.h"
+#include "HardwareInfo.h"
 #include "Platform/PlatformFile.h"
 #include "Platform/PlatformOps.h"
 #include "RootEnumSource.h"
@@ -29,8 +30,7 @@ CRoot::~CRoot()
         QMutexLocker guard(&m_threadMutex);
         if (m_thread) {
             m_thread->wait();
-            delete m_thread;
-            m_thread = nullptr;
+            m_thread.reset();
         }
     }
     DestroyRetired();
@@ -164,10 +164,11 @@ bool CRoot::RemoveDevice(CDevice *device)
     return TakeDevice(device);
 }
 
-bool CRoot::WriteHardwareInfo(const QString &, const QString &, const QString &, const QStringList &)
+bool CRoot::WriteHardwareInfo(const QString &target, const QString &stylesheet, const QString &application,
+                              const QStringList &logLines)
 {
-    // The report writer joins the kernel with the hardware report; until then nothing is written.
-    return false;
+    uint32_t error = 0;
+    return HardwareInfo::Write(*this, target, stylesheet, application, logLines, error);
 }
 
 uint64_t CRoot::SortKey(uint16_t number, EnumSource source, uint8_t sub, uint32_t mediaType, uint32_t rank)
@@ -327,12 +328,11 @@ Thread_Init *CRoot::EnsureThread(bool full, const RefreshKinds &kinds)
     // Called with m_threadMutex held: a thread that is running is kept, a finished one replaced.
     if (m_thread && !m_thread->isFinished() && m_thread->isRunning())
         return nullptr;
-    if (m_thread) {
+    if (m_thread)
         m_thread->wait();
-        delete m_thread;
-    }
-    m_thread = new Thread_Init(this, full, kinds);
-    return m_thread;
+    // A waiter may still hold the old thread; it goes when the last holder lets go.
+    m_thread = std::make_shared<Thread_Init>(this, full, kinds);
+    return m_thread.get();
 }
 
 bool CRoot::Refresh(bool full, const RefreshKinds &kinds)
@@ -348,15 +348,13 @@ bool CRoot::Refresh(bool full, const RefreshKinds &kinds)
 bool CRoot::QueueRequest(const std::function<bool(Thread_Init *)> &enqueue)
 {
     QMutexLocker guard(&m_threadMutex);
-    if (m_thread && m_thread->isRunning() && enqueue(m_thread))
+    if (m_thread && m_thread->isRunning() && enqueue(m_thread.get()))
         return true;
     // No thread, a finished one, or one on its way out: a new thread serves the request.
-    if (m_thread) {
+    if (m_thread)
         m_thread->wait();
-        delete m_thread;
-    }
-    m_thread = new Thread_Init(this, false, RefreshKinds());
-    if (!enqueue(m_thread))
+    m_thread = std::make_shared<Thread_Init>(this, false, RefreshKinds());
+    if (!enqueue(m_thread.get()))
         return false;
     m_thread->start(QThread::InheritPriority);
     return true;
@@ -382,7 +380,7 @@ bool CRoot::IsEnumerating()
 
 bool CRoot::WaitForEnumeration(unsigned long timeoutMs)
 {
-    Thread_Init *thread = nullptr;
+    std::shared_ptr<Thread_Init> thread;
     {
         QMutexLocker guard(&m_threadMutex);
         thread = m_thread;

@@ -163,7 +163,7 @@ private:
     uint8_t m_flags[2] = {0, 1};
 
     QList<CDevice *> m_devices;
-    Thread_Init *m_thread = nullptr;
+    std::shared_ptr<Thread_Init> m_thread;
     QMutex m_threadMutex; // guards m_thread
     std::atomic<bool> m_refreshed{false};
     QMutex m_listMutex;
