@@ -278,6 +278,58 @@ bool CImageHandle_Tarvo::ReadWrite(bool read, std::uint64_t first, std::uint32_t
     return true;
 }
 
+bool CImageHandle_Tarvo::Canonical(const QByteArray &packed, const std::uint8_t *data, std::size_t size,
+                                   int &level)
+{
+    if (packed.size() < 2)
+        return false;
+    // The levels that give the header's level field.
+    static const QList<int> byField[4] = {{1, 0}, {2, 3, 4, 5}, {6}, {7, 8, 9}};
+    const QList<int> &candidates = byField[(std::uint8_t(packed[1]) >> 6) & 3];
+    QList<int> order = candidates;
+    if (candidates.contains(level)) {
+        order.removeAll(level);
+        order.prepend(level);
+    }
+    std::vector<std::uint8_t> again(compressBound(uLong(size)));
+    for (int l : order) {
+        uLongf n = uLongf(again.size());
+        if (compress2(again.data(), &n, data, uLong(size), l) != Z_OK)
+            continue;
+        if (n == uLongf(packed.size()) && std::memcmp(again.data(), packed.constData(), n) == 0) {
+            level = l;
+            return true;
+        }
+    }
+    return false;
+}
+
+bool CImageHandle_Tarvo::VerifyGroupRecord(std::uint64_t group, int &level, QString &problem)
+{
+    // The group index as stored: its inflated offsets are in m_index (the last entry is the
+    // record's own offset).
+    const std::uint64_t g = m_groups[group];
+    std::uint8_t head[8];
+    std::uint32_t error = 0;
+    QByteArray packed;
+    std::vector<std::uint8_t> index((m_index.size() - 1) * 8);
+    for (std::size_t k = 0; k + 1 < m_index.size(); ++k)
+        putLe64(index.data() + k * 8, m_index[k]);
+    if (!TransferBytes(true, g, 8, head, error) || !ReadPacked(g + 8, le32(head), packed) ||
+        !Canonical(packed, index.data(), index.size(), level)) {
+        problem = QStringLiteral("group %1 is not stored as it was written").arg(group);
+        return false;
+    }
+    return true;
+}
+
+bool CImageHandle_Tarvo::ReadPacked(std::uint64_t offset, std::uint64_t length, QByteArray &packed)
+{
+    packed.resize(qsizetype(length));
+    std::uint32_t error = 0;
+    return TransferBytes(true, offset, std::uint32_t(length), packed.data(), error);
+}
+
 bool CImageHandle_Tarvo::Verify(const std::function<bool(std::uint64_t, std::uint64_t)> &progress,
                                 QString &problem)
 {
@@ -288,6 +340,7 @@ bool CImageHandle_Tarvo::Verify(const std::function<bool(std::uint64_t, std::uin
     }
     const std::uint64_t blocks = m_header.Blocks();
     std::uint32_t adler = 1;
+    int level = -1;
     for (std::uint64_t b = 0; b < blocks; ++b) {
         // Every block is inflated afresh, so that its checksum is computed from the file.
         m_blockNumber = -1;
@@ -296,6 +349,15 @@ bool CImageHandle_Tarvo::Verify(const std::function<bool(std::uint64_t, std::uin
         if (!LoadBlock(b, &problem))
             return false;
         adler = Tarvo::Adler(adler, m_block.data(), m_blockBytes);
+        const std::uint64_t i = b % m_header.BlocksPerGroup();
+        QByteArray packed;
+        if (!ReadPacked(m_index[i], m_index[i + 1] - m_index[i], packed) ||
+            !Canonical(packed, m_block.data(), std::size_t(m_blockBytes), level)) {
+            problem = QStringLiteral("block %1 is not stored as it was written").arg(b);
+            return false;
+        }
+        if (i + 1 == m_index.size() - 1 && !VerifyGroupRecord(b / m_header.BlocksPerGroup(), level, problem))
+            return false;
         if (progress && (b % 64 == 0 || b + 1 == blocks) && !progress(b + 1, blocks)) {
             problem = QStringLiteral("verification stopped");
             return false;

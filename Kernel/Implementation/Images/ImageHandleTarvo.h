@@ -25,6 +25,9 @@ public:
     QString GetString(int index) const { return m_strings[index & 3]; }
 
     // Inflates every group index and block and checks both Adler-32 sums against the trailer.
+    // Different zlib streams can inflate to the same bytes (a damaged distance inside a run of
+    // zeros), so every stream must also be exactly what compressing its bytes again at the
+    // image's level gives.
     // progress(done, total blocks) may return false to stop (the result is then false).
     bool Verify(const std::function<bool(std::uint64_t, std::uint64_t)> &progress, QString &problem);
 
@@ -32,6 +35,11 @@ private:
     void Parse();
     bool LoadGroup(std::uint64_t group, QString *problem);
     bool LoadBlock(std::uint64_t block, QString *problem);
+    // True when `packed` is what compressing `data` gives at the level its zlib header names
+    // (the level found is kept in `level` for the next stream).
+    static bool Canonical(const QByteArray &packed, const std::uint8_t *data, std::size_t size, int &level);
+    bool VerifyGroupRecord(std::uint64_t group, int &level, QString &problem);
+    bool ReadPacked(std::uint64_t offset, std::uint64_t length, QByteArray &packed);
     bool Inflate(const QByteArray &in, std::uint8_t *out, std::uint64_t capacity, std::uint64_t &produced);
 
     Tarvo::Header m_header;

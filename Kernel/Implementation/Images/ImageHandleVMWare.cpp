@@ -253,7 +253,10 @@ void CImageHandle_VMWare::OpenFirst(const QString &file)
     const QString folder = QFileInfo(file).path();
     std::uint64_t start = 0;
     for (const ExtentLine &line : descriptor.extents) {
-        QString path = QFileInfo(line.file).isAbsolute() ? line.file : folder + QLatin1Char('/') + line.file;
+        QString path = QFileInfo(line.file).isAbsolute() ||
+                               (folder == QLatin1String(".") && !file.startsWith(QLatin1String("./")))
+                           ? line.file
+                           : folder + QLatin1Char('/') + line.file;
         if (!AddFile(path)) {
             Fail(QStringLiteral("extent %1 cannot be opened").arg(line.file));
             return;
