@@ -3,6 +3,7 @@
 #include "Devices.h"
 #include "HwInfo.h"
 #include "Image.h"
+#include "Partitions.h"
 #include "Read.h"
 #include "Version.h"
 
@@ -30,6 +31,7 @@ const QList<Command> &commands()
         // Commands register here, in the order --help lists them.
         {"hwinfo", "FILE", "Writes the hardware-information report of this machine as XML.", &runHwInfo},
         {"devices", "[--json]", "Lists the storage devices in kernel order.", &runDevices},
+        {"partitions", "SOURCE [--json]", "Lists a device's partition style, partitions and gaps.", &runPartitions},
         {"read", "SOURCE --offset N --length N [--raw]", "Prints bytes of a device as a hex dump, or raw.", &runRead},
         {"image", "info FILE [--json] | create SOURCE OUTPUT [--level N] [--sectors-per-block N] [--description TEXT] | verify FILE", "Shows, creates (own format) or verifies a disk image.", &runImage},
     };
