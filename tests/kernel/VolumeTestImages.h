@@ -129,6 +129,7 @@ inline Made Get(const QString &kind)
                         "HFSLBL");
         m = iso;
         m.path.clear();
+        m.label.clear(); // the name lives in the catalog, which the base behaviour does not read
         if (!iso.path.isEmpty()) {
             const TestUtil::ToolResult r = TestUtil::run("mmls", {"-t", "mac", "-b", "2048", iso.path});
             for (const QByteArray &line : r.out.split('\n')) {

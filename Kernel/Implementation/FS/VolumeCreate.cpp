@@ -20,6 +20,24 @@ using namespace DiskBytes;
 
 namespace VolumeCreate {
 
+namespace {
+
+// After detection found nothing: the UDF recognition sequence, then an ISO 9660 descriptor
+// (an optical image on a device that is not an optical drive).
+std::uint32_t ProbeOptical(cStorage &storage)
+{
+    if (Detect::ProbeUdf(storage))
+        return static_cast<std::uint32_t>(FileSystemKind::Udf);
+    std::vector<std::uint8_t> d(2048, 0);
+    std::uint32_t error = 0;
+    if (storage.GetSize() >= 32768 + 2048 && storage.ReadBytes(32768, 2048, d.data(), error) &&
+        Detect::IsCdfs(d.data(), d.size()))
+        return static_cast<std::uint32_t>(FileSystemKind::Cdfs);
+    return Detect::KindUnknown;
+}
+
+} // namespace
+
 std::uint32_t NextMountId()
 {
     static std::atomic<std::uint32_t> next{1};
@@ -139,9 +157,8 @@ std::unique_ptr<CVolume> CreateVolume(CPartition &partition, const Options &opti
         bool usedBackup = false;
         d.kind = Detect::DetectFileSystem(partition, 0, partition.GetSize(), false, usedBackup);
     }
-    if (!options.description && Detect::Undetermined(d.kind) && partition.GetLength() >= 32 &&
-        Detect::ProbeUdf(partition))
-        d.kind = static_cast<std::uint32_t>(FileSystemKind::Udf);
+    if (!options.description && Detect::Undetermined(d.kind) && partition.GetLength() >= 32)
+        d.kind = ProbeOptical(partition);
     if (d.kind == static_cast<std::uint32_t>(FileSystemKind::Ufs) && !partition.GetParent()) {
         const std::vector<BsdSlice> slices = ReadBsdDiskLabel(partition, partition.GetStart());
         if (!slices.empty()) {
@@ -180,8 +197,8 @@ std::unique_ptr<CVolume> CreateVolume(cStorage &storage, MediaType mediaType, co
         d.ready = storage.GetTotalSectors() > 0 && storage.ReadSectors(0, 1, probe.data(), error) ? 1 : 0;
         bool usedBackup = false;
         d.kind = Detect::DetectFileSystem(storage, 0, storage.GetSize(), false, usedBackup, mediaType);
-        if (d.kind == Detect::KindUnknown && Detect::ProbeUdf(storage))
-            d.kind = static_cast<std::uint32_t>(FileSystemKind::Udf);
+        if (d.kind == Detect::KindUnknown && storage.GetTotalSectors() >= 32)
+            d.kind = ProbeOptical(storage);
     }
     if (d.mountId == 0)
         d.mountId = NextMountId();
