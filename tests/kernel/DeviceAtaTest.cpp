@@ -202,6 +202,16 @@ TEST(AtaIdentifyFields, AtaInformationPage)
 {
     const auto req = AtaIdentify::BuildAtaInfoInquiry();
     ASSERT_EQ(req.size(), AtaIdentify::ScsiRequestSize);
+    DeviceControl::SCSI_PASS_THROUGH h;
+    std::memcpy(&h, req.data(), sizeof h);
+    EXPECT_EQ(h.Length, sizeof h);
+    EXPECT_EQ(h.CdbLength, 6);
+    EXPECT_EQ(h.DataIn, DeviceControl::SCSI_IOCTL_DATA_IN);
+    EXPECT_EQ(h.DataTransferLength, 572u);
+    EXPECT_EQ(h.SenseInfoOffset, 56u);
+    EXPECT_EQ(h.SenseInfoLength, 32);
+    EXPECT_EQ(h.DataBufferOffset, 88u);
+    EXPECT_EQ(AtaIdentify::ScsiPassThroughCode, DeviceControl::IOCTL_SCSI_PASS_THROUGH);
     EXPECT_EQ(req[36], 0x12);
     EXPECT_EQ(req[37], 0x01);
     EXPECT_EQ(req[38], 0x89);
