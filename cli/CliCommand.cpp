@@ -6,6 +6,7 @@
 #include "Partitions.h"
 #include "Read.h"
 #include "Version.h"
+#include "Volumes.h"
 
 namespace Cli {
 
@@ -32,6 +33,7 @@ const QList<Command> &commands()
         {"hwinfo", "FILE", "Writes the hardware-information report of this machine as XML.", &runHwInfo},
         {"devices", "[--json]", "Lists the storage devices in kernel order.", &runDevices},
         {"partitions", "SOURCE [--json]", "Lists a device's partition style, partitions and gaps.", &runPartitions},
+        {"volumes", "SOURCE [--json]", "Lists the volume of every partition: file system, geometry, label and integrity.", &runVolumes},
         {"read", "SOURCE --offset N --length N [--raw]", "Prints bytes of a device as a hex dump, or raw.", &runRead},
         {"image", "info FILE [--json] | create SOURCE OUTPUT [--level N] [--sectors-per-block N] [--description TEXT] | verify FILE", "Shows, creates (own format) or verifies a disk image.", &runImage},
     };
