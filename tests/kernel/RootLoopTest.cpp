@@ -137,6 +137,40 @@ TEST(RootLoop, LoopDevicesAppearWithBlockdevSizes)
     EXPECT_NE(root.FindDeviceByPath(mbr.Device()), nullptr);
 }
 
+TEST(RootLoop, FileSystemOnTheWholeDeviceIsItsVolume)
+{
+    if (!TestUtil::canAttachLoop())
+        GTEST_SKIP() << "loop devices cannot be attached here (needs root and /dev/loop-control)";
+    if (!TestUtil::haveTool("mke2fs"))
+        GTEST_SKIP() << "mke2fs is needed";
+    QTemporaryDir dir;
+    ASSERT_TRUE(dir.isValid());
+    const QString image = dir.filePath("ext4.img");
+    const QString uuid = "0b8c7f62-5d1e-4a3b-9c2d-8e7f6a5b4c3d";
+    TestUtil::ToolResult mk =
+        TestUtil::run("mke2fs", {"-q", "-F", "-t", "ext4", "-L", "BRINDLE_T", "-U", uuid, image, "8M"});
+    ASSERT_EQ(mk.exitCode, 0) << mk.err.toStdString();
+    LoopGuard loop(image, {});
+    ASSERT_FALSE(loop.Device().isEmpty()) << loop.Error().toStdString();
+
+    CRoot root;
+    ASSERT_TRUE(root.RefreshAndWait());
+    CDevice *d = root.FindDeviceByPath(loop.Device());
+    ASSERT_NE(d, nullptr);
+    const QList<VolumeInfo> &volumes = d->GetDescriptor().volumes;
+    ASSERT_EQ(volumes.size(), 1);
+    const VolumeInfo &v = volumes.first();
+    EXPECT_EQ(v.path, loop.Device());
+    EXPECT_EQ(v.label, "BRINDLE_T");
+    EXPECT_EQ(v.serial, uuid);
+    EXPECT_EQ(v.fileSystem, FileSystemKind::Ext4);
+    EXPECT_EQ(v.partitionNumber, 0u);
+    ASSERT_EQ(v.extents.size(), 1);
+    EXPECT_EQ(v.extents[0].offset, 0u);
+    EXPECT_EQ(v.extents[0].length, d->GetSize());
+    EXPECT_EQ(d->GetPartStyle(), PartStyle::DeviceAsVolume);
+}
+
 TEST(RootLoop, PlatformListingNamesAndNumbers)
 {
     using namespace Sysfs;
