@@ -439,6 +439,32 @@ TEST_F(PlatformLoopTest, AtaPassThroughOnLoopFailsQuietly)
     EXPECT_TRUE(root.platform.isEmpty());
     EXPECT_TRUE(root.internal.isEmpty());
 
+    // The SMART interface and the SCSI pass-through fail the same way.
+    GETVERSIONINPARAMS version{};
+    EXPECT_FALSE(disk.DIOC(SMART_GET_VERSION, nullptr, 0, &version, sizeof version, &returned));
+    SENDCMDINPARAMS smart{};
+    smart.irDriveRegs.bCommandReg = 0xEC;
+    QByteArray smartAnswer(16 + 512, '\0');
+    EXPECT_FALSE(disk.DIOC(SMART_RCV_DRIVE_DATA, &smart, sizeof smart, smartAnswer.data(), smartAnswer.size(),
+                           &returned));
+    QByteArray scsi(56 + 32 + 512, '\0');
+    SCSI_PASS_THROUGH spt{};
+    spt.Length = 56;
+    spt.CdbLength = 6;
+    spt.SenseInfoLength = 32;
+    spt.DataIn = SCSI_IOCTL_DATA_IN;
+    spt.DataTransferLength = 96;
+    spt.TimeOutValue = 5;
+    spt.SenseInfoOffset = 56;
+    spt.DataBufferOffset = 88;
+    spt.Cdb[0] = 0x12; // INQUIRY
+    spt.Cdb[4] = 96;
+    std::memcpy(scsi.data(), &spt, sizeof spt);
+    EXPECT_FALSE(disk.DIOC(IOCTL_SCSI_PASS_THROUGH, scsi.constData(), scsi.size(), scsi.data(), scsi.size(),
+                           &returned));
+    EXPECT_FALSE(disk.IsLost());
+    EXPECT_TRUE(root.platform.isEmpty());
+
     // A malformed request never reaches the device.
     header.DataBufferOffset = 4000;
     std::memcpy(request.data(), &header, sizeof header);

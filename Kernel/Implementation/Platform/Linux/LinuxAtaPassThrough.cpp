@@ -22,32 +22,13 @@ constexpr uint32_t kMaxTransfer = 64 * 1024;
 
 } // namespace
 
-uint32_t LinuxAtaPassThrough(int fd, const void *in, uint32_t inSize, void *out, uint32_t outSize,
-                             uint32_t &returned)
+uint32_t LinuxAtaCommand(int fd, uint8_t cur[8], uint8_t prev[8], bool ext, int direction, uint8_t *data,
+                         uint32_t length, uint32_t timeoutSeconds)
 {
-    returned = 0;
-    if (!in || inSize < sizeof(ATA_PASS_THROUGH_EX) || !out || outSize < sizeof(ATA_PASS_THROUGH_EX))
+    const bool dataIn = direction == 1;
+    const bool dataOut = direction == 2;
+    if (length > kMaxTransfer || (length % 512) != 0 || ((dataIn || dataOut) != (length != 0)))
         return SystemError::InvalidParameter;
-    ATA_PASS_THROUGH_EX request;
-    std::memcpy(&request, in, sizeof request);
-    const bool dataIn = request.AtaFlags & DeviceControl::ATA_FLAGS_DATA_IN;
-    const bool dataOut = request.AtaFlags & DeviceControl::ATA_FLAGS_DATA_OUT;
-    const bool ext = request.AtaFlags & DeviceControl::ATA_FLAGS_48BIT_COMMAND;
-    const uint32_t length = request.DataTransferLength;
-    if (request.Length != sizeof(ATA_PASS_THROUGH_EX) || (dataIn && dataOut) || length > kMaxTransfer ||
-        (length % 512) != 0 || ((dataIn || dataOut) && length == 0))
-        return SystemError::InvalidParameter;
-    const uint64_t offset = request.DataBufferOffset;
-    if ((dataIn || dataOut) &&
-        (offset < sizeof(ATA_PASS_THROUGH_EX) || offset + length > (dataIn ? outSize : inSize)))
-        return SystemError::InvalidParameter;
-
-    QByteArray data(int(length ? length : 1), '\0');
-    if (dataOut)
-        std::memcpy(data.data(), static_cast<const uint8_t *>(in) + offset, length);
-
-    const uint8_t *cur = request.CurrentTaskFile;
-    const uint8_t *prev = request.PreviousTaskFile;
     uint8_t cdb[16] = {};
     cdb[0] = kAtaPassThrough16;
     const uint8_t protocol = dataIn ? kProtocolPioIn : dataOut ? kProtocolPioOut : kProtocolNonData;
@@ -77,14 +58,13 @@ uint32_t LinuxAtaPassThrough(int fd, const void *in, uint32_t inSize, void *out,
     io.sbp = sense;
     io.dxfer_direction = dataIn ? SG_DXFER_FROM_DEV : dataOut ? SG_DXFER_TO_DEV : SG_DXFER_NONE;
     io.dxfer_len = length;
-    io.dxferp = length ? data.data() : nullptr;
-    io.timeout = (request.TimeOutValue ? request.TimeOutValue : 15) * 1000;
+    io.dxferp = length ? data : nullptr;
+    io.timeout = (timeoutSeconds ? timeoutSeconds : 15) * 1000;
     if (ioctl(fd, SG_IO, &io) != 0)
         return errnoToSystemError(errno);
     if (io.host_status != 0 || (io.driver_status & 0x0F) > 1)
         return SystemError::IoDevice;
 
-    ATA_PASS_THROUGH_EX answer = request;
     // The ATA status return descriptor (type 9) of descriptor-format sense data holds the registers.
     const uint8_t *desc = nullptr;
     if (io.sb_len_wr >= 8 && (sense[0] & 0x7F) == 0x72) {
@@ -94,29 +74,62 @@ uint32_t LinuxAtaPassThrough(int fd, const void *in, uint32_t inSize, void *out,
                 desc = sense + i;
                 break;
             }
-            if (sense[i + 1] == 0 && sense[i] != 0x09)
-                break;
         }
     }
     if (desc) {
-        answer.CurrentTaskFile[0] = desc[3];  // error
-        answer.CurrentTaskFile[1] = desc[5];  // sector count
-        answer.CurrentTaskFile[2] = desc[7];  // LBA low
-        answer.CurrentTaskFile[3] = desc[9];  // LBA mid
-        answer.CurrentTaskFile[4] = desc[11]; // LBA high
-        answer.CurrentTaskFile[5] = desc[12]; // device
-        answer.CurrentTaskFile[6] = desc[13]; // status
+        cur[0] = desc[3];  // error
+        cur[1] = desc[5];  // sector count
+        cur[2] = desc[7];  // LBA low
+        cur[3] = desc[9];  // LBA mid
+        cur[4] = desc[11]; // LBA high
+        cur[5] = desc[12]; // device
+        cur[6] = desc[13]; // status
         if (ext) {
-            answer.PreviousTaskFile[1] = desc[4];
-            answer.PreviousTaskFile[2] = desc[6];
-            answer.PreviousTaskFile[3] = desc[8];
-            answer.PreviousTaskFile[4] = desc[10];
+            prev[1] = desc[4];
+            prev[2] = desc[6];
+            prev[3] = desc[8];
+            prev[4] = desc[10];
         }
-    } else if (io.status == 0) {
-        answer.CurrentTaskFile[6] = 0x50; // ready, no error: the translation returned no registers
     } else {
-        answer.CurrentTaskFile[6] = 0x51;
+        // The translation returned no registers: only the outcome is known.
+        cur[0] = io.status == 0 ? 0 : 0x04;
+        cur[6] = io.status == 0 ? 0x50 : 0x51;
     }
+    return 0;
+}
+
+uint32_t LinuxAtaPassThrough(int fd, const void *in, uint32_t inSize, void *out, uint32_t outSize,
+                             uint32_t &returned)
+{
+    returned = 0;
+    if (!in || inSize < sizeof(ATA_PASS_THROUGH_EX) || !out || outSize < sizeof(ATA_PASS_THROUGH_EX))
+        return SystemError::InvalidParameter;
+    ATA_PASS_THROUGH_EX request;
+    std::memcpy(&request, in, sizeof request);
+    const bool dataIn = request.AtaFlags & DeviceControl::ATA_FLAGS_DATA_IN;
+    const bool dataOut = request.AtaFlags & DeviceControl::ATA_FLAGS_DATA_OUT;
+    const bool ext = request.AtaFlags & DeviceControl::ATA_FLAGS_48BIT_COMMAND;
+    const uint32_t length = request.DataTransferLength;
+    if (request.Length != sizeof(ATA_PASS_THROUGH_EX) || (dataIn && dataOut) || length > kMaxTransfer ||
+        (length % 512) != 0 || ((dataIn || dataOut) && length == 0))
+        return SystemError::InvalidParameter;
+    const uint64_t offset = request.DataBufferOffset;
+    if ((dataIn || dataOut) &&
+        (offset < sizeof(ATA_PASS_THROUGH_EX) || offset + length > (dataIn ? outSize : inSize)))
+        return SystemError::InvalidParameter;
+
+    QByteArray data(int(length ? length : 1), '\0');
+    if (dataOut)
+        std::memcpy(data.data(), static_cast<const uint8_t *>(in) + offset, length);
+    ATA_PASS_THROUGH_EX answer = request;
+    const uint32_t error = LinuxAtaCommand(fd, answer.CurrentTaskFile, answer.PreviousTaskFile, ext,
+                                           dataIn    ? 1
+                                           : dataOut ? 2
+                                                     : 0,
+                                           reinterpret_cast<uint8_t *>(data.data()),
+                                           (dataIn || dataOut) ? length : 0, request.TimeOutValue);
+    if (error)
+        return error;
     std::memcpy(out, &answer, sizeof answer);
     returned = sizeof answer;
     if (dataIn) {
@@ -124,4 +137,70 @@ uint32_t LinuxAtaPassThrough(int fd, const void *in, uint32_t inSize, void *out,
         returned = uint32_t(offset + length);
     }
     return 0;
+}
+
+uint32_t LinuxSmartControl(int fd, uint32_t code, const void *in, uint32_t inSize, void *out,
+                           uint32_t outSize, uint32_t &returned)
+{
+    using namespace DeviceControl;
+    returned = 0;
+    if (code == SMART_GET_VERSION) {
+        // Answered only for drives that take ATA commands: a check-power-mode command must go through.
+        uint8_t cur[8] = {0, 0, 0, 0, 0, 0xA0, 0xE5, 0}, prev[8] = {};
+        if (const uint32_t error = LinuxAtaCommand(fd, cur, prev, false, 0, nullptr, 0, 15))
+            return error;
+        if (cur[6] & 0x01)
+            return SystemError::InvalidFunction;
+        GETVERSIONINPARAMS v{};
+        v.bVersion = 1;
+        v.bRevision = 1;
+        v.bIDEDeviceMap = 1;
+        v.fCapabilities = 0x7; // ATA identify, ATAPI identify, SMART commands
+        if (!out || outSize < sizeof v)
+            return SystemError::InsufficientBuffer;
+        std::memcpy(out, &v, sizeof v);
+        returned = sizeof v;
+        return 0;
+    }
+    if (!in || inSize < sizeof(SENDCMDINPARAMS) || !out || outSize < sizeof(SENDCMDOUTPARAMS))
+        return SystemError::InvalidParameter;
+    SENDCMDINPARAMS request{};
+    std::memcpy(&request, in, std::min<size_t>(inSize, sizeof request));
+    const IDEREGS &r = request.irDriveRegs;
+    uint8_t cur[8] = {r.bFeaturesReg, r.bSectorCountReg, r.bSectorNumberReg, r.bCylLowReg,
+                      r.bCylHighReg,  r.bDriveHeadReg,   r.bCommandReg,      0};
+    uint8_t prev[8] = {};
+    SENDCMDOUTPARAMS header{};
+    auto *answer = static_cast<uint8_t *>(out);
+    if (code == SMART_RCV_DRIVE_DATA) {
+        if (outSize < sizeof header + 512)
+            return SystemError::InsufficientBuffer;
+        QByteArray data(512, '\0');
+        if (const uint32_t error =
+                LinuxAtaCommand(fd, cur, prev, false, 1, reinterpret_cast<uint8_t *>(data.data()), 512, 15))
+            return error;
+        header.cBufferSize = 512;
+        header.bIDEError = cur[0];
+        header.bDriverError = (cur[6] & 0x01) ? 1 : 0;
+        std::memcpy(answer, &header, sizeof header);
+        std::memcpy(answer + sizeof header, data.constData(), 512);
+        returned = sizeof header + 512;
+        return header.bDriverError ? SystemError::GenFailure : 0;
+    }
+    if (code == SMART_SEND_DRIVE_COMMAND) {
+        if (const uint32_t error = LinuxAtaCommand(fd, cur, prev, false, 0, nullptr, 0, 15))
+            return error;
+        header.bIDEError = cur[0];
+        header.bDriverError = (cur[6] & 0x01) ? 1 : 0;
+        IDEREGS back{cur[0], cur[1], cur[2], cur[3], cur[4], cur[5], cur[6], 0};
+        returned = sizeof header;
+        if (outSize >= sizeof header + sizeof back) {
+            header.cBufferSize = sizeof back;
+            std::memcpy(answer + sizeof header, &back, sizeof back);
+            returned += sizeof back;
+        }
+        std::memcpy(answer, &header, sizeof header);
+        return header.bDriverError ? SystemError::GenFailure : 0;
+    }
+    return SystemError::InvalidFunction;
 }

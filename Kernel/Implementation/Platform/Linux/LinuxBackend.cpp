@@ -91,6 +91,26 @@ QString mountPointOf(dev_t device)
     return {};
 }
 
+// The error of a failed transfer: an I/O error of a block device that has left the system means the
+// device is gone.
+uint32_t transferError(int fd, int err)
+{
+    if (err == EIO) {
+        struct stat st
+        {
+        };
+        if (fstat(fd, &st) == 0 && S_ISBLK(st.st_mode) &&
+            ::access(QStringLiteral("/sys/dev/block/%1:%2")
+                         .arg(major(st.st_rdev))
+                         .arg(minor(st.st_rdev))
+                         .toLatin1()
+                         .constData(),
+                     F_OK) != 0)
+            return SystemError::DevNotExist;
+    }
+    return errnoToTransferError(err);
+}
+
 } // namespace
 
 LinuxBackend::LinuxBackend() = default;
@@ -166,7 +186,7 @@ bool LinuxBackend::Read(PlatformHandle handle, void *buffer, uint32_t size, uint
         if (n < 0) {
             if (errno == EINTR)
                 continue;
-            error = errnoToTransferError(errno);
+            error = transferError(fdOf(handle), errno);
             return false;
         }
         if (n == 0)
@@ -186,7 +206,7 @@ bool LinuxBackend::Write(PlatformHandle handle, const void *buffer, uint32_t siz
         if (n < 0) {
             if (errno == EINTR)
                 continue;
-            error = errnoToTransferError(errno);
+            error = transferError(fdOf(handle), errno);
             return false;
         }
         if (n == 0)

@@ -311,6 +311,10 @@ uint32_t LinuxDeviceControl::Answer(uint32_t code, const void *in, uint32_t inSi
         return queryProperty(info, in, inSize, out, outSize, returned);
     case IOCTL_ATA_PASS_THROUGH:
         return LinuxAtaPassThrough(m_fd, in, inSize, out, outSize, returned);
+    case SMART_GET_VERSION:
+    case SMART_RCV_DRIVE_DATA:
+    case SMART_SEND_DRIVE_COMMAND:
+        return LinuxSmartControl(m_fd, code, in, inSize, out, outSize, returned);
     case IOCTL_SCSI_PASS_THROUGH:
         return LinuxScsiPassThrough(m_fd, in, inSize, out, outSize, returned);
     case IOCTL_SCSI_PASS_THROUGH_DIRECT:

@@ -267,6 +267,12 @@ QList<EnumCandidate> CSysfsEnumerationSource::Candidates()
     QDir dir(m_sysBlock);
     QStringList names = dir.entryList(QDir::Dirs | QDir::NoDotAndDotDot | QDir::System, QDir::Name);
     QStringList physical;
+    // Hidden disks (the per-path devices of multipath NVMe) are not listed, as lsblk does not.
+    names.erase(std::remove_if(names.begin(), names.end(),
+                               [this](const QString &n) {
+                                   return Attribute(n, QStringLiteral("hidden")) == QLatin1String("1");
+                               }),
+                names.end());
     for (const QString &n : std::as_const(names)) {
         if (Sysfs::Classify(n) == Sysfs::Kind::Physical)
             physical << n;
