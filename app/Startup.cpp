@@ -13,6 +13,7 @@
 #include "ClientFramework/HighDpi.h"
 #include "ClientFramework/Log/ApplicationLog.h"
 #include "ClientFramework/Log/KernelLog.h"
+#include "ClientFramework/QuitOnSignal.h"
 #include "ClientFramework/Settings/SettingsDocument.h"
 
 #include "Kernel/Implementation/KernelVersion.h"
@@ -145,8 +146,10 @@ int Startup::run(const QStringList &argumentList, int &argc, char **argv)
         logVersion(!root ? tr("pending...") : kernelVersion.isEmpty() ? tr("Undefined") : kernelVersion);
 
         int code = 0;
-        if (m_options.runEventLoop)
+        if (m_options.runEventLoop) {
+            Framework::QuitOnSignal quitOnSignal;
             QApplication::exec();
+        }
         code = application->exitCode();
         if (code != 0)
             log.add(tr("Exiting with error code: %1").arg(code));
