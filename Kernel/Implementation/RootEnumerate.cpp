@@ -1,6 +1,7 @@
 #include "RootEnumerate.h"
 
 #include "AtaCommand.h"
+#include "AtaIdentify.h"
 #include "Platform/DeviceControl.h"
 #include "Platform/PlatformFile.h"
 #include "Root.h"
@@ -10,6 +11,7 @@
 #include <QByteArray>
 
 #include <cstring>
+#include <vector>
 
 using namespace DeviceControl;
 
@@ -91,6 +93,15 @@ bool CEnumerator::ReadIdentifyBlock(DeviceInfo &info, uint8_t *block512)
             return true;
         }
     }
+    // Drives behind other buses: the SCSI ATA information page carries the same identify block.
+    std::vector<uint8_t> request = AtaIdentify::BuildAtaInfoInquiry();
+    std::vector<uint8_t> answer = request;
+    uint32_t returned = 0;
+    if (info.handle->DIOC(AtaIdentify::ScsiPassThroughCode, request.data(), uint32_t(request.size()),
+                          answer.data(), uint32_t(answer.size()), &returned) &&
+        AtaIdentify::ParseAtaInfoReply(answer.data(), returned, block512) &&
+        RootIdentity::IsNonZero(block512, 512))
+        return true;
     return false;
 }
 
