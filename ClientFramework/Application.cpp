@@ -48,7 +48,7 @@ void Application::open()
 
     auto &settings = SettingsDocument::instance();
     settings.open(SettingsDocument::defaultPath());
-    log.load(settings.element(QStringLiteral("log")));
+    registerComponent(QStringLiteral("log"), &log);
     // The command line overrides the stored log options for this run.
     log.overrideForRun(CLI::Arguments::flagValue(QStringLiteral("clearlog"), false),
                        CLI::Arguments::isOptionSet(QStringLiteral("logpath"))

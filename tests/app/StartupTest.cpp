@@ -159,6 +159,8 @@ TEST_F(StartupTest, RunWithDiskRequestEndsWithErrorCode)
     EXPECT_TRUE(log.trimmed().endsWith("  Application Log Closed"));
     const QByteArray xml = TestUtil::readFile(settingsPath());
     EXPECT_TRUE(xml.contains("<main-view")) << xml.constData();
+    EXPECT_TRUE(xml.contains("path=\"%APPDATA%\"")) << xml.constData();
+    EXPECT_TRUE(xml.contains("file=\"brindle.log\"")) << xml.constData();
 }
 
 TEST_F(StartupTest, LogPathAndClearLogOverrideForTheRun)
