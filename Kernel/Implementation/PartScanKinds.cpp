@@ -1,5 +1,8 @@
 #include "PartScanKinds.h"
 
+#include <algorithm>
+
+#include "FS/Detect.h"
 #include "PartScanBytes.h"
 
 namespace PartScan {
@@ -26,53 +29,27 @@ bool readRange(cStorage &s, std::uint64_t start, std::uint64_t length, std::uint
     return s.ReadSectors(start + first, count, out.data(), error);
 }
 
-bool powerOfTwoSectorSize(std::uint32_t v)
-{
-    return v >= 512 && v <= 4096 && (v & (v - 1)) == 0;
-}
-
 } // namespace
 
 std::uint32_t bootSectorKind(const QByteArray &b)
 {
-    if (b.size() < 512)
-        return Unknown;
-    if (hasText(b, 3, "NTFS    "))
-        return 10;
-    if (hasText(b, 3, "EXFAT   "))
-        return 9;
-    const std::uint8_t jump = static_cast<std::uint8_t>(b[0]);
-    if ((jump == 0xEB || jump == 0xE9) && hasBootSignature(b) && powerOfTwoSectorSize(le16(b, 11)) &&
-        static_cast<std::uint8_t>(b[13]) != 0) {
-        if (hasText(b, 82, "FAT32   "))
-            return 8;
-        if (hasText(b, 54, "FAT12   ") || hasText(b, 54, "FAT16   ") || hasText(b, 54, "FAT     "))
-            return 7;
-    }
-    return Unknown;
+    const std::uint32_t k = Detect::ClassifyBootBlock(reinterpret_cast<const std::uint8_t *>(b.constData()),
+                                                      std::size_t(b.size()));
+    return k >= 7 && k <= 23 ? k : Unknown;
 }
 
 std::uint32_t sniffFileSystem(cStorage &s, std::uint64_t start, std::uint64_t length)
 {
-    QByteArray head;
-    if (!readRange(s, start, length, 0, 4096, head))
+    // Enough for the superblocks that lie furthest in (Btrfs at 64 KiB).
+    const std::uint32_t bps = s.GetBytesPerSector();
+    if (bps < 512 || bps > 65536)
         return Unknown;
-    std::uint32_t k = bootSectorKind(head);
-    if (k != Unknown)
-        return k;
-    if (hasText(head, 0, "XFSB"))
-        return 21;
-    if (le16(head, 1024 + 56) == 0xEF53) {
-        const std::uint32_t compat = le32(head, 1024 + 92);
-        const std::uint32_t incompat = le32(head, 1024 + 96);
-        if (incompat & (0x40 | 0x80 | 0x200))
-            return 16;
-        return (compat & 0x4) ? 15 : 14;
-    }
-    QByteArray btrfs;
-    if (readRange(s, start, length, 65536, 4096, btrfs) && hasText(btrfs, 64, "_BHRfS_M"))
-        return 20;
-    return Unknown;
+    const std::uint64_t want = (68 * 1024 + bps - 1) / bps;
+    const std::uint32_t sectors = static_cast<std::uint32_t>(std::min<std::uint64_t>(want, length));
+    QByteArray head;
+    if (sectors == 0 || !readRange(s, start, length, 0, sectors * bps, head))
+        return Unknown;
+    return bootSectorKind(head);
 }
 
 std::uint32_t kindOfMbrType(std::uint8_t type)

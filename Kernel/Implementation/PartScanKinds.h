@@ -1,6 +1,5 @@
-// What the scan can tell about a partition's contents from its first sectors: the common boot
-// sectors and superblocks, enough to name a partition's kind before its volume is opened. The
-// volume layer's detection supersedes it.
+// What the scan can tell about a device or partition from its first sectors (through the
+// file-system classifier), and the other volume managers' labels.
 #pragma once
 
 #include <QByteArray>
@@ -11,11 +10,11 @@
 
 namespace PartScan {
 
-// The FileSystemKind code of a boot sector (NTFS, exFAT, FAT12/16, FAT32), else 0xFFFFFFFF.
+// The FileSystemKind code (7..23) the classifier finds at the start of `sector`, else 0xFFFFFFFF.
 std::uint32_t bootSectorKind(const QByteArray &sector);
 
-// The FileSystemKind code found in the first sectors of the range (boot sectors, ext2/3/4, XFS,
-// Btrfs), else 0xFFFFFFFF. Reads at most 64 KiB + 4 KiB, never outside the range.
+// The FileSystemKind code found in the first 68 KiB of the range, else 0xFFFFFFFF. Never reads
+// outside the range.
 std::uint32_t sniffFileSystem(cStorage &storage, std::uint64_t start, std::uint64_t length);
 
 // The kind a boot-record type byte alone decides (BSD 5, Storage Spaces 6), else 0xFFFFFFFF.

@@ -217,3 +217,31 @@ TEST(MbrScan, DeviceWithoutSignatureIsLvmZfsOrRaw)
 }
 
 } // namespace
+
+namespace {
+
+TEST_F(MbrDisk, FileSystemsNameTheKindAndAWholeDeviceVolumeHasNoTable)
+{
+    if (!TestUtil::haveTool("mkfs.fat"))
+        GTEST_SKIP() << "mkfs.fat is needed";
+    ASSERT_TRUE(makeImage(image, 64));
+    ASSERT_TRUE(sfdisk(image, "label: dos\nstart=2048,size=40960,type=6\nstart=43008,size=8192,type=83\n"));
+    ASSERT_EQ(TestUtil::run("mkfs.fat", {"-F", "16", "--offset", "2048", image, "20480"}).exitCode, 0);
+    FileStorage disk(image);
+    Scanned s = scan(disk);
+    EXPECT_EQ(s.result.partitions[1]->GetKind(), 7u);
+    EXPECT_EQ(s.result.partitions[2]->GetKind(), 0xFFFFFFFFu) << "an empty partition has no file system";
+
+    const QString whole = dir.filePath("whole.img");
+    ASSERT_TRUE(makeImage(whole, 40));
+    ASSERT_EQ(TestUtil::run("mkfs.fat", {"-F", "32", whole}).exitCode, 0);
+    FileStorage volume(whole);
+    s = scan(volume);
+    EXPECT_EQ(s.result.partStyle, PartStyle::DeviceAsVolume);
+    ASSERT_EQ(s.result.partitions.size(), 1u);
+    EXPECT_EQ(s.result.partitions[0]->GetKind(), 8u);
+    EXPECT_EQ(s.result.partitions[0]->GetLength(), 40u * 2048u);
+    EXPECT_TRUE(s.messages.isEmpty());
+}
+
+} // namespace
