@@ -66,6 +66,17 @@ TEST_F(GptDisk, EntriesMatchMmlsAndSgdisk)
             EXPECT_EQ(p->GetKind(), 4u) << "0c01 is the Microsoft reserved type";
 }
 
+TEST_F(GptDisk, HybridBootRecordStillReadsAsGpt)
+{
+    // A hybrid boot record mirrors two entries beside the protective one.
+    ASSERT_TRUE(sgdisk(image, {"-h", "1:2"}));
+    Scanned s = scanImage();
+    EXPECT_EQ(s.result.partStyle, PartStyle::Gpt);
+    EXPECT_TRUE(s.messages.isEmpty()) << s.messages.join('\n').toStdString();
+    EXPECT_EQ(leaves(s.result.partitions), merged(mmlsRows(image)));
+    EXPECT_EQ(s.made, 4);
+}
+
 TEST_F(GptDisk, DamagedPrimaryHeaderFallsBackToTheBackup)
 {
     // Flip a byte of the primary header's disk GUID: its CRC no longer matches.
