@@ -19,9 +19,10 @@ namespace {
 class LoopDevice
 {
 public:
-    explicit LoopDevice(const QString &image)
+    explicit LoopDevice(const QString &image, int sectorSize = 512)
     {
-        TestUtil::ToolResult r = TestUtil::run("losetup", {"-f", "--show", image});
+        TestUtil::ToolResult r =
+            TestUtil::run("losetup", {"-b", QString::number(sectorSize), "-f", "--show", image});
         if (r.exitCode == 0)
             m_path = QString::fromUtf8(r.out).trimmed();
     }
@@ -41,10 +42,10 @@ private:
 using Row = std::tuple<qint64, qint64, bool>; // start, length, unallocated
 
 // mmls's partitions and unallocated rows (its meta rows left out).
-std::vector<Row> mmls(const QString &image)
+std::vector<Row> mmls(const QString &image, const QStringList &extra = {})
 {
     std::vector<Row> rows;
-    TestUtil::ToolResult r = TestUtil::run("mmls", {image});
+    TestUtil::ToolResult r = TestUtil::run("mmls", extra + QStringList{image});
     for (const QByteArray &line : r.out.split('\n')) {
         const QList<QByteArray> f = line.simplified().split(' ');
         if (f.size() < 5 || !f[0].endsWith(':') || f[1] == "Meta")
@@ -106,12 +107,12 @@ protected:
         EXPECT_EQ(r.exitCode, 0) << r.err.toStdString();
         return QJsonDocument::fromJson(r.out).object();
     }
-    bool sfdisk(const QByteArray &script)
+    bool sfdisk(const QByteArray &script, const QString &target = QString())
     {
         TestUtil::writeFile(image + ".sfdisk", script);
         QProcess p;
         p.setStandardInputFile(image + ".sfdisk");
-        p.start("sfdisk", {"--no-reread", "--no-tell-kernel", image});
+        p.start("sfdisk", {"--no-reread", "--no-tell-kernel", target.isEmpty() ? image : target});
         return p.waitForFinished(60000) && p.exitCode() == 0;
     }
     QTemporaryDir dir;
@@ -144,6 +145,19 @@ TEST_F(PartitionsCli, BootRecordDiskMatchesMmls)
     for (const char *key : {"index", "kind", "kindName", "start", "length", "active", "tableSector",
                             "typeGuid", "guid", "name", "children"})
         EXPECT_TRUE(primary.contains(key)) << key;
+}
+
+TEST_F(PartitionsCli, FourKilobyteSectorsCountInDeviceSectors)
+{
+    LoopDevice loop(image, 4096);
+    ASSERT_FALSE(loop.path().isEmpty());
+    ASSERT_TRUE(sfdisk("label: dos\nstart=256,size=2048,type=83\nstart=4096,size=4096,type=5\n"
+                       "start=4352,size=1024,type=83\n",
+                       loop.path()));
+    QJsonObject doc = list(loop.path());
+    EXPECT_EQ(doc["sectorSize"].toInteger(), 4096);
+    EXPECT_EQ(doc["totalSectors"].toInteger(), 16384);
+    EXPECT_EQ(listing(doc), mmls(image, {"-b", "4096"}));
 }
 
 TEST_F(PartitionsCli, GptDiskMatchesMmlsAndSgdisk)
