@@ -131,8 +131,9 @@ TEST(CliDevices, SourceResolver)
     EXPECT_TRUE(error.contains("there is no device 65000")) << error.toStdString();
     EXPECT_EQ(Cli::resolveSource(root, "/no/such/thing", error), nullptr);
     EXPECT_FALSE(error.isEmpty());
-    if (!Cli::imageOpener())
+    if (!Cli::imageOpener()) {
         EXPECT_TRUE(error.contains("no such device or file")) << error.toStdString();
+    }
     QTemporaryDir dir;
     const QString file = dir.filePath("plain.bin");
     ASSERT_TRUE(TestUtil::writeFile(file, QByteArray(4096, 'x')));
