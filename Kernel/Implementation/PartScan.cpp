@@ -16,6 +16,8 @@ namespace {
 constexpr std::uint32_t UnknownKind = 0xFFFFFFFF;
 // An extended chain longer than this is treated as damaged (a real disk holds a few dozen).
 constexpr std::uint32_t MaxChainRecords = 16384;
+// Partitions whose contents are looked at for their kind; the rest stay of unknown kind.
+constexpr std::uint32_t MaxSniffed = 1024;
 
 class Scanner
 {
@@ -67,6 +69,7 @@ private:
     std::uint64_t m_total = 0;
     unsigned m_shift = 9;
     std::vector<bool> m_taken;
+    std::uint32_t m_sniffed = 0;
     std::vector<CPartition *> m_extended;
     std::vector<std::pair<Mbr::Entry, int>> m_ldmEntries; // boot-record 0x42 entries, made after the LDM read
     std::optional<Ldm::Area> m_gptMetadata, m_gptData;
@@ -116,6 +119,9 @@ std::uint32_t Scanner::kindOf(std::uint32_t fromType, int volume, std::uint64_t 
         if (fs >= 7 && fs <= 23)
             return fs;
     }
+    if (m_sniffed >= MaxSniffed)
+        return UnknownKind;
+    ++m_sniffed;
     return sniffFileSystem(m_storage, start, length);
 }
 
