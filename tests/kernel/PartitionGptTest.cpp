@@ -233,4 +233,41 @@ TEST(GptScan, HugeEntryCountIsRefusedWithoutReadingIt)
     EXPECT_LT(disk->ReadCount(), 20u);
 }
 
+TEST(GptScan, HeaderFromTheLastSectorThatDoesNotPointAtSectorOneIsReported)
+{
+    // Only a header in the last sector, whose other header would be in sector 5.
+    const std::uint64_t total = 1 << 16;
+    QByteArray entries(128 * 128, '\0');
+    std::memcpy(entries.data(), Linux.data(), 16);
+    for (int b = 0; b < 16; ++b)
+        entries[16 + b] = char(b + 1);
+    const std::uint64_t first = 2048, last = 4095;
+    std::memcpy(entries.data() + 32, &first, 8);
+    std::memcpy(entries.data() + 40, &last, 8);
+    QByteArray h(512, '\0');
+    h.replace(0, 8, "EFI PART");
+    auto put32 = [&h](int o, std::uint32_t v) { std::memcpy(h.data() + o, &v, 4); };
+    auto put64 = [&h](int o, std::uint64_t v) { std::memcpy(h.data() + o, &v, 8); };
+    put32(12, 92);
+    put64(24, total - 1);
+    put64(32, 5);
+    put64(40, 34);
+    put64(48, total - 34);
+    put64(72, total - 33);
+    put32(80, 128);
+    put32(84, 128);
+    put32(88, Gpt::crc32(entries.constData(), std::size_t(entries.size())));
+    put32(16, Gpt::crc32(h.constData(), 92));
+    QByteArray head(1 << 20, '\0');
+    head.replace(0, 512, mbrSector({mbrEntry(0, 0xEE, 1, 0xFFFF)}));
+    const QByteArray tail = entries + h;
+    PartScan::MemoryStorage disk(512, total, head, tail);
+    Scanned s = scan(disk);
+    EXPECT_EQ(s.messages, (QStringList{"Error (6) in GPT header on a device Test Disk",
+                                       "Copy of GPT header on a device Test Disk not found",
+                                       "GPT header on a device Test Disk not in first sector",
+                                       "Copy of GPT entries on a device Test Disk not found"}));
+    EXPECT_EQ(s.made, 1);
+}
+
 } // namespace
