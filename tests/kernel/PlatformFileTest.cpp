@@ -9,6 +9,8 @@
 #include <gtest/gtest.h>
 
 #include <cstring>
+#include <thread>
+#include <vector>
 
 namespace {
 
@@ -438,6 +440,20 @@ TEST_F(PlatformFileTest, LockDismountUnlockFollowTheVolumeStates)
     EXPECT_FALSE(volume.IsOpened());
 }
 
+TEST_F(PlatformFileTest, DestroyingALockedVolumeUnlocksAndClosesIt)
+{
+    auto succeed = [](const QByteArray &, QByteArray &, uint32_t &) -> uint32_t { return 0; };
+    backend.SetControlHandler(DeviceControl::FSCTL_LOCK_VOLUME, succeed);
+    backend.SetControlHandler(DeviceControl::FSCTL_UNLOCK_VOLUME, succeed);
+    {
+        CPlatformFile volume(&root, "/dev/vol0", PlatformKind::Volume);
+        ASSERT_TRUE(volume.Lock());
+    }
+    EXPECT_EQ(root.InternalTexts(), QStringList{"Not closed handle /dev/vol0"});
+    EXPECT_EQ(backend.CallCount("control 0x9001c"), 1);
+    EXPECT_EQ(backend.OpenHandles(), 0);
+}
+
 TEST_F(PlatformFileTest, UpdateClosesTheDeviceOnSuccess)
 {
     CPlatformFile disk(&root, "/dev/disk0", PlatformKind::Device);
@@ -516,6 +532,30 @@ TEST_F(PlatformFileTest, FreeSpaceAsksForTheVolumePathWithASeparator)
     ASSERT_EQ(root.platform.size(), 1);
     EXPECT_EQ(root.platform[0].operation, uint32_t(PlatformOperation::GetFileSizeEx));
     EXPECT_EQ(root.platform[0].error, SystemError::NotReady);
+}
+
+TEST_F(PlatformFileTest, ThreadsSharingAHandleGetTheirOwnSectors)
+{
+    // Positioning and transfer happen under the handle's lock: no thread reads another's position.
+    CPlatformFile disk(&root, "/dev/disk0", PlatformKind::Device);
+    const QByteArray data = backend.FileData("/dev/disk0");
+    std::vector<std::thread> threads;
+    std::vector<int> mismatches(4, 0);
+    for (int t = 0; t < 4; ++t) {
+        threads.emplace_back([&, t] {
+            QByteArray buffer(512, '\0');
+            for (int i = 0; i < 200; ++i) {
+                const int sector = (t * 31 + i * 7) % 128;
+                if (!disk.Read(uint64_t(sector) * 512, 512, buffer.data()) ||
+                    buffer != data.mid(sector * 512, 512))
+                    ++mismatches[t];
+            }
+        });
+    }
+    for (auto &thread : threads)
+        thread.join();
+    EXPECT_EQ(mismatches, std::vector<int>(4, 0));
+    EXPECT_TRUE(disk.Close());
 }
 
 TEST(PlatformOperationTextTest, KnownAndUnknownCodes)
