@@ -285,6 +285,12 @@ TEST(VolumeBsd, LabelledUfsPartitionBecomesAContainer)
     ASSERT_TRUE(inner);
     EXPECT_EQ(inner->GetKind(), 17u); // a slice is not examined for a label again
 
+    // A table entry that already names a BSD container gets its slices the same way.
+    MemoryStorage typedStorage(bytes);
+    CPartition typed(nullptr, &typedStorage, nullptr, 5, 0, sectors);
+    EXPECT_FALSE(VolumeCreate::CreateVolume(typed));
+    EXPECT_EQ(typed.GetChildCount(), 2u);
+
     // A damaged checksum leaves the partition a plain UFS volume.
     bytes[512 + 60] = 1;
     MemoryStorage damaged(bytes);

@@ -159,7 +159,12 @@ std::unique_ptr<CVolume> CreateVolume(CPartition &partition, const Options &opti
     }
     if (!options.description && Detect::Undetermined(d.kind) && partition.GetLength() >= 32)
         d.kind = ProbeOptical(partition);
-    if (d.kind == static_cast<std::uint32_t>(FileSystemKind::Ufs) && !partition.GetParent()) {
+    // A UFS partition, or one whose table entry already calls it a BSD container, is examined for
+    // a disk label once (its slices are not).
+    const bool bsdCandidate = d.kind == static_cast<std::uint32_t>(FileSystemKind::Ufs) ||
+                              (d.kind == static_cast<std::uint32_t>(FileSystemKind::PartitionBsd) &&
+                               partition.GetChildCount() == 0);
+    if (bsdCandidate && !partition.GetParent()) {
         const std::vector<BsdSlice> slices = ReadBsdDiskLabel(partition, partition.GetStart());
         if (!slices.empty()) {
             partition.SetKind(static_cast<std::uint32_t>(FileSystemKind::PartitionBsd));
