@@ -4,6 +4,7 @@
 #include "Commander.h"
 #include "MainView.h"
 #include "ProcessingAction.h"
+#include "KernelHost.h"
 #include "RequestHost.h"
 
 #include "ClientFramework/AppIdentity.h"
@@ -65,7 +66,7 @@ int Startup::run(const QStringList &argumentList, int &argc, char **argv)
     auto &log = ApplicationLog::instance();
     // Destroyed in reverse: the main window, the instance segment, the application, the arguments.
     std::unique_ptr<CLI::Arguments> arguments;
-    std::unique_ptr<CLI::NoKernelHost> host;
+    std::unique_ptr<CLI::KernelHost> host;
     std::unique_ptr<Framework::Application> application;
     std::unique_ptr<Framework::SingleInstanceGuard> guard;
     std::unique_ptr<CRoot> root;
@@ -127,7 +128,9 @@ int Startup::run(const QStringList &argumentList, int &argc, char **argv)
         commander = std::make_unique<Solution::Commander>();
         mainView = std::make_unique<MainView>(commander.get());
 
-        host = std::make_unique<CLI::NoKernelHost>();
+        host = std::make_unique<CLI::KernelHost>(*root);
+        if (arguments->isOptionSet(QStringLiteral("mountdi")))
+            host->mountImage(arguments->parser.value(QStringLiteral("mountdi")));
         auto *action = new CLI::ProcessingAction(*host, application.get());
         action->runAfterInitialization(application.get());
         QObject::connect(action, &CLI::ProcessingAction::quitRequested, application.get(),
