@@ -30,10 +30,10 @@ const QList<Command> &commands()
 {
     static const QList<Command> table = {
         // Commands register here, in the order --help lists them.
-        {"hwinfo", "FILE", "Writes the hardware-information report of this machine as XML.", &runHwInfo},
         {"devices", "[--json]", "Lists the storage devices in kernel order.", &runDevices},
         {"partitions", "SOURCE [--json]", "Lists a device's partition style, partitions and gaps.", &runPartitions},
         {"volumes", "SOURCE [--json]", "Lists the volume of every partition: file system, geometry, label and integrity.", &runVolumes},
+        {"hwinfo", "FILE", "Writes the hardware-information report of this machine as XML.", &runHwInfo},
         {"read", "SOURCE --offset N --length N [--raw]", "Prints bytes of a device as a hex dump, or raw.", &runRead},
         {"image", "info FILE [--json] | create SOURCE OUTPUT [--level N] [--sectors-per-block N] [--description TEXT] | verify FILE", "Shows, creates (own format) or verifies a disk image.", &runImage},
     };

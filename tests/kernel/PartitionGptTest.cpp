@@ -61,9 +61,11 @@ TEST_F(GptDisk, EntriesMatchMmlsAndSgdisk)
         EXPECT_TRUE(info.contains(QStringLiteral("Partition name: '%1'").arg(p->GetGpt().name)));
     }
     EXPECT_EQ(n, 4);
-    for (const auto &p : s.result.partitions)
-        if (p->GetStart() == 40960)
+    for (const auto &p : s.result.partitions) {
+        if (p->GetStart() == 40960) {
             EXPECT_EQ(p->GetKind(), 4u) << "0c01 is the Microsoft reserved type";
+        }
+    }
 }
 
 TEST_F(GptDisk, HybridBootRecordStillReadsAsGpt)
