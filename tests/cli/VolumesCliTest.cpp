@@ -105,8 +105,9 @@ TEST_F(VolumesCli, JsonListsEveryVolumeWithItsGeometry)
         ASSERT_TRUE(b.hasMatch());
         EXPECT_EQ(ext["clusterSize"].toInteger(), b.captured(1).toLongLong());
         const auto fb = QRegularExpression("Free Blocks:\\s*(\\d+)").match(QString::fromUtf8(e.out));
-        if (fb.hasMatch())
+        if (fb.hasMatch()) {
             EXPECT_EQ(ext["freeBytes"].toInteger(), fb.captured(1).toLongLong() * b.captured(1).toLongLong());
+        }
     }
 }
 

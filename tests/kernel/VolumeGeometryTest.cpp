@@ -61,21 +61,25 @@ TEST_P(VolumeMade, GeometryLabelAndSerialAgreeWithIndependentReaders)
         expected = tags.value("BLOCK_SIZE").toLongLong();
     else
         expected = cluster.toLongLong();
-    if (expected > 0)
+    if (expected > 0) {
         EXPECT_EQ(v->GetClusterSize(), expected);
+    }
     const qint64 sector = Fsstat(m.path, "Sector Size");
-    if (sector > 0 && c.kind <= 10)
+    if (sector > 0 && c.kind <= 10) {
         EXPECT_EQ(v->GetBytesPerSector(), sector);
-    if (c.labelFromBlkid)
+    }
+    if (c.labelFromBlkid) {
         EXPECT_EQ(v->GetLabel(), tags.value("LABEL"));
-    else if (!m.label.isEmpty())
+    } else if (!m.label.isEmpty()) {
         EXPECT_EQ(v->GetLabel(), m.label);
+    }
     const QString uuid = tags.value("UUID").remove('-').toUpper();
     const QString serialFrom = QString::fromLatin1(c.serialFrom);
-    if (serialFrom == "uuid")
+    if (serialFrom == "uuid") {
         EXPECT_EQ(Hex8(v->GetSerialNumber()), uuid.left(8));
-    else if (serialFrom == "uuidlow")
+    } else if (serialFrom == "uuidlow") {
         EXPECT_EQ(Hex8(v->GetSerialNumber()), uuid.right(8));
+    }
     // Clusters stay inside the volume.
     std::uint64_t first = 0, last = 0, cluster0 = 0;
     const std::uint32_t perCluster = v->GetClusterRange(first, last, cluster0);
