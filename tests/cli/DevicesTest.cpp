@@ -15,34 +15,6 @@
 
 namespace {
 
-class LoopGuard
-{
-public:
-    LoopGuard(const QString &image, const QStringList &options)
-    {
-        TestUtil::ToolResult r = TestUtil::run("losetup", options + QStringList{"-f", "--show", image});
-        if (r.exitCode == 0)
-            m_device = QString::fromUtf8(r.out).trimmed();
-    }
-    ~LoopGuard()
-    {
-        if (!m_device.isEmpty())
-            TestUtil::run("losetup", {"-d", m_device});
-    }
-    LoopGuard(const LoopGuard &) = delete;
-    LoopGuard &operator=(const LoopGuard &) = delete;
-    const QString &Device() const { return m_device; }
-
-private:
-    QString m_device;
-};
-
-qint64 Blockdev(const QString &option, const QString &device)
-{
-    TestUtil::ToolResult r = TestUtil::run("blockdev", {option, device});
-    return r.exitCode == 0 ? QString::fromUtf8(r.out).trimmed().toLongLong() : -1;
-}
-
 QJsonObject EntryFor(const QJsonArray &list, const QString &path)
 {
     for (const QJsonValue &v : list) {
@@ -62,8 +34,8 @@ TEST(CliDevices, JsonMatchesBlockdevForLoopDevices)
     ASSERT_TRUE(dir.isValid());
     const QString image = dir.filePath("disk.img");
     ASSERT_EQ(TestUtil::run("truncate", {"-s", "24M", image}).exitCode, 0);
-    LoopGuard plain(image, {});
-    LoopGuard big(image, {"-b", "4096"});
+    TestUtil::LoopDevice plain(image, {});
+    TestUtil::LoopDevice big(image, {"-b", "4096"});
     ASSERT_FALSE(plain.Device().isEmpty());
     ASSERT_FALSE(big.Device().isEmpty());
 
@@ -73,7 +45,7 @@ TEST(CliDevices, JsonMatchesBlockdevForLoopDevices)
     QJsonDocument doc = QJsonDocument::fromJson(r.out, &error);
     ASSERT_EQ(error.error, QJsonParseError::NoError) << r.out.toStdString();
     const QJsonArray list = doc.array();
-    for (const LoopGuard *loop : {&plain, &big}) {
+    for (const TestUtil::LoopDevice *loop : {&plain, &big}) {
         SCOPED_TRACE(loop->Device().toStdString());
         QJsonObject o = EntryFor(list, loop->Device());
         ASSERT_FALSE(o.isEmpty()) << r.out.toStdString();
@@ -85,9 +57,9 @@ TEST(CliDevices, JsonMatchesBlockdevForLoopDevices)
         for (const QString &k : keys)
             EXPECT_TRUE(o.contains(k)) << k.toStdString();
         const qint64 sectorSize = o.value("sectorSize").toInteger();
-        EXPECT_EQ(sectorSize, Blockdev("--getss", loop->Device()));
-        EXPECT_EQ(o.value("physicalSectorSize").toInteger(), Blockdev("--getpbsz", loop->Device()));
-        EXPECT_EQ(o.value("totalSectors").toInteger() * sectorSize, Blockdev("--getsize64", loop->Device()));
+        EXPECT_EQ(sectorSize, TestUtil::blockdev("--getss", loop->Device()));
+        EXPECT_EQ(o.value("physicalSectorSize").toInteger(), TestUtil::blockdev("--getpbsz", loop->Device()));
+        EXPECT_EQ(o.value("totalSectors").toInteger() * sectorSize, TestUtil::blockdev("--getsize64", loop->Device()));
         EXPECT_EQ(o.value("source").toInt(), 3);
         EXPECT_EQ(o.value("mediaType").toString(), "Fixed Disk");
         EXPECT_EQ(o.value("partStyle").toString(), "Raw (not partitioned)");
@@ -112,7 +84,7 @@ TEST(CliDevices, JsonMatchesBlockdevForLoopDevices)
             ASSERT_FALSE(o.isEmpty()) << nobody.out.toStdString();
             EXPECT_TRUE(o.value("attributes").toArray().contains(QJsonValue("Not Ready")));
             EXPECT_EQ(o.value("totalSectors").toInteger() * o.value("sectorSize").toInteger(),
-                      Blockdev("--getsize64", plain.Device()));
+                      TestUtil::blockdev("--getsize64", plain.Device()));
             TestUtil::ToolResult why =
                 TestUtil::run("setpriv", {"--reuid=65534", "--regid=65534", "--clear-groups",
                                           TestUtil::builtProgram("brindle-cli"), "devices"});
@@ -144,7 +116,7 @@ TEST(CliDevices, SourceResolver)
 
     if (!TestUtil::canAttachLoop())
         GTEST_SKIP() << "loop devices cannot be attached here (needs root and /dev/loop-control)";
-    LoopGuard loop(file, {});
+    TestUtil::LoopDevice loop(file, {});
     ASSERT_FALSE(loop.Device().isEmpty());
     // A device path is identified and added once; disk:N names the same object afterwards.
     CDevice *d = Cli::resolveSource(root, loop.Device(), error);

@@ -13,35 +13,6 @@
 
 namespace {
 
-// A loop device over an image, detached again when the guard goes.
-class AttachedLoop
-{
-public:
-    AttachedLoop(const QString &image, const QStringList &options)
-    {
-        TestUtil::ToolResult r = TestUtil::run("losetup", options + QStringList{"-f", "--show", image});
-        if (r.exitCode == 0)
-            m_device = QString::fromUtf8(r.out).trimmed();
-    }
-    ~AttachedLoop()
-    {
-        if (!m_device.isEmpty())
-            TestUtil::run("losetup", {"-d", m_device});
-    }
-    AttachedLoop(const AttachedLoop &) = delete;
-    AttachedLoop &operator=(const AttachedLoop &) = delete;
-    const QString &Device() const { return m_device; }
-
-private:
-    QString m_device;
-};
-
-qint64 Blockdev(const QString &option, const QString &device)
-{
-    TestUtil::ToolResult r = TestUtil::run("blockdev", {option, device});
-    return r.exitCode == 0 ? QString::fromUtf8(r.out).trimmed().toLongLong() : -1;
-}
-
 struct ReportedDevice
 {
     QMap<QString, QString> values; // direct children and geometry values
@@ -115,8 +86,8 @@ TEST(CliHwInfo, ReportOfThisMachineListsLoopDevicesAsBlockdevSeesThem)
                "sfdisk -q " +
                    mbrImage});
     ASSERT_EQ(sf.exitCode, 0) << sf.err.toStdString();
-    AttachedLoop mbr(mbrImage, {});
-    AttachedLoop gpt(gptImage, {"-b", "4096"});
+    TestUtil::LoopDevice mbr(mbrImage, {});
+    TestUtil::LoopDevice gpt(gptImage, {"-b", "4096"});
     ASSERT_FALSE(mbr.Device().isEmpty());
     ASSERT_FALSE(gpt.Device().isEmpty());
     sf =
@@ -148,15 +119,15 @@ TEST(CliHwInfo, ReportOfThisMachineListsLoopDevicesAsBlockdevSeesThem)
         EXPECT_TRUE(devices.contains(path)) << path.toStdString();
     EXPECT_EQ(devices.size(), listed.size());
 
-    for (const AttachedLoop *loop : {&mbr, &gpt}) {
+    for (const TestUtil::LoopDevice *loop : {&mbr, &gpt}) {
         SCOPED_TRACE(loop->Device().toStdString());
         ASSERT_TRUE(devices.contains(loop->Device()));
         const ReportedDevice &d = devices[loop->Device()];
-        const qint64 sectorSize = Blockdev("--getss", loop->Device());
+        const qint64 sectorSize = TestUtil::blockdev("--getss", loop->Device());
         EXPECT_EQ(d.values.value("is_ready"), "1");
         EXPECT_EQ(d.values.value("geometry/bytes_per_sector").toLongLong(), sectorSize);
         EXPECT_EQ(d.values.value("geometry/total_sectors").toLongLong() * sectorSize,
-                  Blockdev("--getsize64", loop->Device()));
+                  TestUtil::blockdev("--getsize64", loop->Device()));
         EXPECT_EQ(d.values.value("bios_name"), QString()); // not a physical disk
         EXPECT_EQ(d.values.value("ata/accessible_sectors"), "Not supported");
         EXPECT_GE(d.sectors, 2); // sectors 0 and 63 at least

@@ -30,4 +30,35 @@ QByteArray readFile(const QString &path);
 // Path of a built program (brindle, brindle-cli) in the build tree.
 QString builtProgram(const QString &name);
 
+// A loop device attached over an image file (losetup OPTIONS -f --show IMAGE), detached again when
+// the guard goes. Device() is empty when it could not be attached.
+class LoopDevice
+{
+public:
+    LoopDevice(const QString &image, const QStringList &options = {})
+    {
+        ToolResult r = run("losetup", options + QStringList{"-f", "--show", image});
+        if (r.exitCode == 0)
+            m_device = QString::fromUtf8(r.out).trimmed();
+    }
+    ~LoopDevice()
+    {
+        if (!m_device.isEmpty())
+            run("losetup", {"-d", m_device});
+    }
+    LoopDevice(const LoopDevice &) = delete;
+    LoopDevice &operator=(const LoopDevice &) = delete;
+    const QString &Device() const { return m_device; }
+
+private:
+    QString m_device;
+};
+
+// What `blockdev OPTION DEVICE` prints as a number (--getsize64, --getss, --getpbsz); -1 on failure.
+inline qint64 blockdev(const QString &option, const QString &device)
+{
+    ToolResult r = run("blockdev", {option, device});
+    return r.exitCode == 0 ? QString::fromUtf8(r.out).trimmed().toLongLong() : -1;
+}
+
 } // namespace TestUtil
