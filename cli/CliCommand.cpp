@@ -5,6 +5,7 @@
 #include "Image.h"
 #include "Partitions.h"
 #include "Read.h"
+#include "Template.h"
 #include "Version.h"
 #include "Volumes.h"
 
@@ -36,6 +37,7 @@ const QList<Command> &commands()
         {"hwinfo", "FILE", "Writes the hardware-information report of this machine as XML.", &runHwInfo},
         {"read", "SOURCE --offset N --length N [--raw]", "Prints bytes of a device as a hex dump, or raw.", &runRead},
         {"image", "info FILE [--json] | create SOURCE OUTPUT [--level N] [--sectors-per-block N] [--description TEXT] | verify FILE", "Shows, creates (own format) or verifies a disk image.", &runImage},
+        {"template", "SOURCE --type ID|NAME --offset N [--copy-offset N] [--json] | SOURCE --auto [--json]", "Prints the field tree of a structure template placed at an offset.", &runTemplate},
     };
     return table;
 }

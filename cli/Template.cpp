@@ -1,0 +1,133 @@
+#include "Template.h"
+
+#include <QJsonDocument>
+
+#include "Kernel/Implementation/Device.h"
+#include "Kernel/Implementation/Root.h"
+#include "Source.h"
+#include "TemplateSource.h"
+#include "hexeditor/templates/core/Catalog.h"
+#include "hexeditor/templates/core/Record.h"
+#include "hexeditor/templates/core/TreeText.h"
+
+namespace Cli {
+
+namespace {
+
+namespace T = HexEditor::Templates;
+
+bool parseNumber(const QString &text, std::uint64_t &value)
+{
+    bool ok = false;
+    if (text.startsWith(QLatin1String("0x"), Qt::CaseInsensitive))
+        value = text.mid(2).toULongLong(&ok, 16);
+    else
+        value = text.toULongLong(&ok, 10);
+    return ok;
+}
+
+int usage(Io &io, const QString &problem)
+{
+    io.err << "brindle-cli template: " << problem << "\n"
+           << "usage: brindle-cli template SOURCE --type ID|NAME --offset N [--copy-offset N] [--json]\n"
+           << "       brindle-cli template SOURCE --auto [--json]\n";
+    return Usage;
+}
+
+QString kindList()
+{
+    QStringList names;
+    for (T::Type t : T::availableTypes())
+        names.append(QStringLiteral("%1 (%2)").arg(int(t)).arg(T::typeName(t)));
+    return names.join(QStringLiteral(", "));
+}
+
+} // namespace
+
+int runTemplate(const QStringList &args, Io &io)
+{
+    QString source;
+    int type = -1;
+    std::uint64_t offset = 0, copyOffset = 0;
+    bool haveOffset = false, haveCopy = false, json = false;
+    for (int i = 0; i < args.size(); ++i) {
+        const QString &a = args[i];
+        if (a == QLatin1String("--json")) {
+            json = true;
+        } else if (a == QLatin1String("--auto")) {
+            type = T::Automatic;
+        } else if (a == QLatin1String("--type")) {
+            if (i + 1 >= args.size())
+                return usage(io, QStringLiteral("--type needs a value"));
+            type = T::typeFromText(args[++i]);
+            if (type < 0)
+                return usage(io, QStringLiteral("'%1' is no template kind").arg(args[i]));
+        } else if (a == QLatin1String("--offset") || a == QLatin1String("--copy-offset")) {
+            if (i + 1 >= args.size())
+                return usage(io, QStringLiteral("%1 needs a value").arg(a));
+            std::uint64_t v = 0;
+            if (!parseNumber(args[++i], v))
+                return usage(io, QStringLiteral("'%1' is not a byte offset").arg(args[i]));
+            (a == QLatin1String("--offset") ? offset : copyOffset) = v;
+            (a == QLatin1String("--offset") ? haveOffset : haveCopy) = true;
+        } else if (a.startsWith(QLatin1String("--"))) {
+            return usage(io, QStringLiteral("unknown option '%1'").arg(a));
+        } else if (source.isEmpty()) {
+            source = a;
+        } else {
+            return usage(io, QStringLiteral("more than one source given"));
+        }
+    }
+    if (source.isEmpty())
+        return usage(io, QStringLiteral("no source given"));
+    if (type < 0)
+        return usage(io, QStringLiteral("--type or --auto is required"));
+    if (type != T::Automatic && !haveOffset)
+        return usage(io, QStringLiteral("--offset is required with --type"));
+
+    CRoot root;
+    QString error;
+    CDevice *device = resolveSource(root, source, error);
+    if (!device) {
+        io.err << "brindle-cli template: " << error << "\n";
+        return Failed;
+    }
+    TemplateSource bytes(*device);
+
+    if (type == T::Automatic) {
+        const T::Placement p = T::automaticChoice(StorageKind::Device, 0xFFFFFFFF,
+                                                  std::uint32_t(device->GetPartStyle()), bytes.sectorSize());
+        type = p.type;
+        offset = p.offset;
+        if (!haveCopy)
+            copyOffset = p.offset;
+        if (type == T::None) {
+            io.err << "brindle-cli template: no template fits " << device->GetDisplayName() << "\n";
+            return Failed;
+        }
+    } else if (!haveCopy) {
+        copyOffset = offset;
+    }
+
+    auto builder = T::createBuilder(type);
+    if (!builder) {
+        io.err << "brindle-cli template: no template for kind " << type << " (" << T::typeName(type)
+               << "); available: " << kindList() << "\n";
+        return Failed;
+    }
+    T::Record record(&bytes, std::move(builder), QLocale::c());
+    record.setOffset(copyOffset, false);
+    record.setOffset(offset, true);
+    if (json)
+        io.out << QJsonDocument(T::listingJson(record)).toJson(QJsonDocument::Indented);
+    else
+        io.out << T::listingText(record);
+    if (!record.root()) {
+        io.err << "brindle-cli template: the record at offset " << offset << " does not fit on "
+               << device->GetDisplayName() << "\n";
+        return Failed;
+    }
+    return Ok;
+}
+
+} // namespace Cli
