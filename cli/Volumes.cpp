@@ -5,11 +5,10 @@
 #include <QJsonObject>
 #include <QJsonValue>
 
-#include <memory>
 #include <vector>
 
 #include "Kernel/Implementation/Device.h"
-#include "Kernel/Implementation/FS/VolumeCreate.h"
+#include "Kernel/Implementation/FS/Volume.h"
 #include "Kernel/Implementation/FS/VolumeIntegrity.h"
 #include "Kernel/Implementation/Root.h"
 #include "Source.h"
@@ -25,24 +24,15 @@ struct Row
     CVolume *volume = nullptr;
 };
 
-// Volumes of a partition and of the slices a BSD label turns it into, depth first.
-void Collect(CPartition *p, const QString &path, std::vector<std::unique_ptr<CVolume>> &owned,
-             std::vector<Row> &rows)
+// The volumes the partition and the slices a BSD label turns it into own, depth first.
+void Collect(CPartition *p, const QString &path, std::vector<Row> &rows)
 {
     if (!p)
         return;
-    const std::uint32_t kind = p->GetKind();
-    // Gaps and extended containers hold no volume of their own.
-    if (kind != static_cast<std::uint32_t>(FileSystemKind::Unallocated) &&
-        kind != static_cast<std::uint32_t>(FileSystemKind::Extended)) {
-        std::unique_ptr<CVolume> volume = VolumeCreate::CreateVolume(*p);
-        if (volume) {
-            rows.push_back(Row{path, p->GetStart(), volume.get()});
-            owned.push_back(std::move(volume));
-        }
-    }
+    if (CVolume *volume = p->Volume())
+        rows.push_back(Row{path, p->GetStart(), volume});
     for (std::uint32_t i = 0; i < p->GetChildCount(); ++i)
-        Collect(p->GetChildPartition(i), path + QLatin1Char('.') + QString::number(i), owned, rows);
+        Collect(p->GetChildPartition(i), path + QLatin1Char('.') + QString::number(i), rows);
 }
 
 QString SerialText(std::uint32_t serial)
@@ -137,15 +127,11 @@ int runVolumes(const QStringList &args, Io &io)
                << "\n";
         return Failed;
     }
-    std::vector<std::unique_ptr<CVolume>> owned;
     std::vector<Row> rows;
+    if (CVolume *whole = device->Volume())
+        rows.push_back(Row{QStringLiteral("-"), 0, whole});
     for (std::uint32_t i = 0; i < device->GetPartitionCount(); ++i)
-        Collect(device->GetPartition(i), QString::number(i), owned, rows);
-    if (device->GetPartitionCount() == 0) {
-        std::unique_ptr<CVolume> volume = VolumeCreate::CreateVolume(*device, device->GetMediaType());
-        rows.push_back(Row{QStringLiteral("-"), 0, volume.get()});
-        owned.push_back(std::move(volume));
-    }
+        Collect(device->GetPartition(i), QString::number(i), rows);
     if (json) {
         QJsonArray list;
         for (const Row &r : rows)

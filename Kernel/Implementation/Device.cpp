@@ -6,6 +6,8 @@
 
 #include "DeviceImage.h"
 #include "DeviceVirtualSource.h"
+#include "FS/Volume.h"
+#include "FS/VolumeCreate.h"
 #include "PartScan.h"
 #include "Platform/PlatformFile.h"
 #include "Root.h"
@@ -23,10 +25,15 @@ CDevice::CDevice(CRoot *root, const DeviceInfo &info, CImageHandle *image, cStor
     m_partMan = std::make_unique<CPartMan>(this);
     ReadIdentityStrings();
     ScanPartitionTables();
+    // A virtual device gets its sectors only with its source (SetVirtualSource).
+    if (m_info.partStyle != PartStyle::VirtualManager)
+        CreateVolumes();
 }
 
 CDevice::~CDevice()
 {
+    // Volumes read through partitions, partitions through the device.
+    m_volume.reset();
     m_partitions.clear();
     if (m_info.handle) {
         if (m_info.handle->IsOpened())
@@ -52,9 +59,55 @@ void CDevice::ScanPartitionTables()
     m_partitions = std::move(result.partitions);
 }
 
+namespace {
+
+void CreatePartitionVolumes(CPartition &partition, const VolumeCreate::Options &options)
+{
+    // Gaps and extended partitions hold no volume of their own; a BSD container gets none either
+    // and its slices, made by the creation, are children visited next.
+    const std::uint32_t kind = partition.GetKind();
+    if (kind != static_cast<std::uint32_t>(FileSystemKind::Unallocated) &&
+        kind != static_cast<std::uint32_t>(FileSystemKind::Extended))
+        partition.SetFileSystemVolume(VolumeCreate::CreateVolume(partition, options));
+    for (std::uint32_t i = 0; i < partition.GetChildCount(); ++i)
+        CreatePartitionVolumes(*partition.GetChildPartition(i), options);
+}
+
+void VisitPartition(CPartition &partition, const std::function<void(CPartition *, CVolume *)> &visit)
+{
+    if (CVolume *v = partition.Volume())
+        visit(&partition, v);
+    for (std::uint32_t i = 0; i < partition.GetChildCount(); ++i)
+        VisitPartition(*partition.GetChildPartition(i), visit);
+}
+
+} // namespace
+
+void CDevice::CreateVolumes()
+{
+    VolumeCreate::Options options;
+    options.root = m_root;
+    if (m_partitions.empty()) {
+        m_volume = VolumeCreate::CreateVolume(*this, m_info.mediaType, options);
+        return;
+    }
+    for (const auto &p : m_partitions)
+        CreatePartitionVolumes(*p, options);
+}
+
+void CDevice::ForEachVolume(const std::function<void(CPartition *, CVolume *)> &visit) const
+{
+    if (m_volume)
+        visit(nullptr, m_volume.get());
+    for (const auto &p : m_partitions)
+        VisitPartition(*p, visit);
+}
+
 void CDevice::SetVirtualSource(cVirtualSource *source)
 {
     m_virtual.reset(source);
+    if (source && !m_volume && m_partitions.empty())
+        CreateVolumes();
 }
 
 // ---- geometry and identity ---------------------------------------------------------------

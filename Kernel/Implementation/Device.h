@@ -8,6 +8,7 @@
 #include <QString>
 #include <QStringList>
 #include <cstdint>
+#include <functional>
 #include <memory>
 #include <vector>
 
@@ -23,6 +24,7 @@ struct Command;
 }
 class CPlatformFile;
 class cVirtualSource;
+class CVolume;
 
 class CDevice : public cDevice
 {
@@ -88,12 +90,20 @@ public:
     void SetDiskSignature(std::uint32_t signature) { m_diskSignature = signature; }
     CPartMan *GetPartMan() const { return m_partMan.get(); }
 
+    // The volume over the whole device when it has no partitions (a disk or image without a
+    // table, a dynamic volume); null when it has partitions, whose volumes they own
+    // (`CPartition::Volume`). Made at construction, never replaced, destroyed first.
+    CVolume *Volume() const { return m_volume.get(); }
+    // Every volume of the device with the partition it lies on (null for the whole-device one):
+    // the whole-device volume, then the partitions' in table order, children after their parent.
+    void ForEachVolume(const std::function<void(CPartition *, CVolume *)> &visit) const;
+
     // The top-level partitions, filled by the partition scan at construction.
     std::vector<std::unique_ptr<CPartition>> &Partitions() { return m_partitions; }
     const std::vector<std::unique_ptr<CPartition>> &Partitions() const { return m_partitions; }
 
     // A virtual device (partition style 6) not assembled from partitions reads through a
-    // source in 512-byte units; the device takes ownership.
+    // source in 512-byte units; the device takes ownership. Its volume is made then, once.
     void SetVirtualSource(cVirtualSource *source);
     // Devices a virtual device is assembled from (not owned).
     QList<CDevice *> &Members() { return m_members; }
@@ -118,6 +128,8 @@ private:
 
     // Runs the partition-table scan of a new device.
     void ScanPartitionTables();
+    // Makes the volume of every partition (children included) or of the whole device. Reads only.
+    void CreateVolumes();
     // Reads model, firmware and serial again from the drive and chooses the serial shown.
     void ReadIdentityStrings();
     void Internal(const QString &text) const;
@@ -127,6 +139,7 @@ private:
     std::uint64_t m_userValue = 0xFFFFFFFFFFFFFFFFull;
     DeviceInfo m_info;
     std::vector<std::unique_ptr<CPartition>> m_partitions;
+    std::unique_ptr<CVolume> m_volume;
     CByteAccess m_bytes;
     std::unique_ptr<CPartMan> m_partMan;
     CImageHandle *m_image = nullptr;

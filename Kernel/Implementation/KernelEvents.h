@@ -9,6 +9,8 @@
 #include <cstdint>
 
 class CDevice;
+class CPartition;
+class CVolume;
 
 // A trace record of the kernel (level 1 error .. 4 verbose; 2 opening, 3 closing of handles).
 struct _event_debug
@@ -51,6 +53,24 @@ struct _event_storage
     CDevice *device = nullptr;
     uint32_t code = 0;
     uint8_t flag = 0;
+};
+
+// The file-system volumes of a device, announced by the kernel root through `kernelVolume`: code 1
+// for each volume of a device right after the device's own event 1 (the whole-device volume first,
+// then the partitions' in table order, a partition's children after it), code 4 for each of them
+// right before the device's event 4. The device builds and owns its volumes before it is listed and
+// destroys them with itself, so a volume stays valid until its code 4 has been delivered; after that
+// it must not be used. `partition` is null for the volume over a whole device without partitions.
+struct _event_volume
+{
+    enum Code : uint32_t {
+        VolumeAdded = 1,
+        VolumeRemoved = 4,
+    };
+    CDevice *device = nullptr;
+    CPartition *partition = nullptr;
+    CVolume *volume = nullptr;
+    uint32_t code = 0;
 };
 
 // A volume is being locked or unlocked by a long operation. Content follows with volume locking.
@@ -176,6 +196,7 @@ Q_DECLARE_METATYPE(_event_debug)
 Q_DECLARE_METATYPE(_event_internal)
 Q_DECLARE_METATYPE(_event_platform)
 Q_DECLARE_METATYPE(_event_storage)
+Q_DECLARE_METATYPE(_event_volume)
 Q_DECLARE_METATYPE(_event_volumelocking)
 Q_DECLARE_METATYPE(_event_action)
 Q_DECLARE_METATYPE(_event_string)

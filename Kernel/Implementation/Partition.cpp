@@ -1,5 +1,7 @@
 #include "Partition.h"
 
+#include "FS/Volume.h"
+
 #include <algorithm>
 #include <cstring>
 
@@ -9,7 +11,17 @@ CPartition::CPartition(cDevice *device, cStorage *storage, CPartition *parent, s
 {
 }
 
-CPartition::~CPartition() = default;
+CPartition::~CPartition()
+{
+    // The volume reads through this partition, the slices of a container through the device.
+    m_fileSystem.reset();
+    m_children.clear();
+}
+
+void CPartition::SetFileSystemVolume(std::unique_ptr<CVolume> volume)
+{
+    m_fileSystem = std::move(volume);
+}
 
 cPartition *CPartition::GetChild(std::uint32_t index) const
 {

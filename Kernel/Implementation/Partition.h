@@ -21,6 +21,7 @@
 
 class cDevice;
 class CPlatformFile;
+class CVolume;
 
 // What the rest of the kernel sees of a partition.
 class cPartition : public cStorage
@@ -116,6 +117,12 @@ public:
     // The volume layer opens the partition's own handle and registers it here (not owned).
     void SetVolumeHandle(CPlatformFile *handle) { m_volumeHandle = handle; }
 
+    // The file-system volume on this partition, made with the device (null for unallocated
+    // space, an extended partition and a BSD container, whose slices are its children). The
+    // partition owns it and destroys it before anything else of its own.
+    CVolume *Volume() const { return m_fileSystem.get(); }
+    void SetFileSystemVolume(std::unique_ptr<CVolume> volume);
+
 private:
     // The data model, in order.
     cDevice *m_device = nullptr;
@@ -135,6 +142,7 @@ private:
 
     cStorage *m_storage = nullptr;
     CPlatformFile *m_volumeHandle = nullptr;
+    std::unique_ptr<CVolume> m_fileSystem;
 
     // Byte access: a one-sector buffer and the number of the sector it holds.
     std::mutex m_byteMutex;

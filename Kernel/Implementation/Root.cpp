@@ -315,12 +315,26 @@ void CRoot::StorageEvent(CDevice *device, uint32_t code, uint8_t flag)
     }
     if (!(m_categoryMask & (1u << category)))
         return;
-    _event_storage event{device, code, flag};
-    if (QThread::currentThread() == thread())
+    const _event_storage event{device, code, flag};
+    // The device's volumes arrive right after it and leave right before it, in one delivery.
+    QList<_event_volume> volumes;
+    if (device && (code == _event_storage::DeviceAdded || code == _event_storage::DeviceRemoved))
+        device->ForEachVolume([&volumes, device, code](CPartition *partition, CVolume *volume) {
+            volumes.append(_event_volume{device, partition, volume, code});
+        });
+    auto deliver = [this, event, volumes] {
+        if (event.code == _event_storage::DeviceRemoved)
+            for (const _event_volume &v : volumes)
+                emit kernelVolume(v);
         emit kernelStorage(event);
+        if (event.code == _event_storage::DeviceAdded)
+            for (const _event_volume &v : volumes)
+                emit kernelVolume(v);
+    };
+    if (QThread::currentThread() == thread())
+        deliver();
     else
-        QMetaObject::invokeMethod(
-            this, [this, event] { emit kernelStorage(event); }, Qt::QueuedConnection);
+        QMetaObject::invokeMethod(this, deliver, Qt::QueuedConnection);
 }
 
 Thread_Init *CRoot::EnsureThread(bool full, const RefreshKinds &kinds)

@@ -46,6 +46,7 @@ void cRoot::RegisterMetaTypes()
     qRegisterMetaType<_event_internal>();
     qRegisterMetaType<_event_platform>();
     qRegisterMetaType<_event_storage>();
+    qRegisterMetaType<_event_volume>();
     qRegisterMetaType<_event_volumelocking>();
     qRegisterMetaType<_event_action>();
     qRegisterMetaType<_event_string>();

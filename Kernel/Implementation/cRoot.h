@@ -39,6 +39,8 @@ signals:
     void kernelInternal(const _event_internal &event);
     void kernelPlatform(const _event_platform &event);
     void kernelStorage(const _event_storage &event);
+    // Volumes of announced devices arriving and leaving (see `_event_volume`).
+    void kernelVolume(const _event_volume &event);
     void kernelVolumeLocking(const _event_volumelocking &event);
     void kernelAction(_event_action &event);
     void kernelString(_event_string &event);
