@@ -1,5 +1,7 @@
 #include "StatusCtrl.h"
 
+#include "ViewResources.h"
+
 #include <QHBoxLayout>
 #include <QIcon>
 #include <QLabel>
@@ -29,6 +31,7 @@ QLabel *makeLabel(const char *name, QWidget *parent, QHBoxLayout *layout)
 
 StatusCtrl::StatusCtrl(QWidget *parent) : QWidget(parent)
 {
+    initViewResources();
     setObjectName(QStringLiteral("StatusCtrl"));
     auto *layout = new QHBoxLayout(this);
     layout->setContentsMargins(4, 0, 4, 0);
@@ -108,9 +111,9 @@ void StatusCtrl::showSelection()
 void StatusCtrl::onStateChanged(bool isHexOffset, bool isReadOnly, bool isBigEndian)
 {
     m_hex = isHexOffset;
-    m_format->setText(
-        tr("<b>%1</b>, %2")
-            .arg(isHexOffset ? tr("HEX") : tr("DEC"), isBigEndian ? tr("Big Endian") : tr("Little Endian")));
+    m_format->setText(tr("<b>%1</b>, %2")
+                          .arg(isHexOffset ? tr("<b>HEX</b>") : tr("<b>DEC</b>"),
+                               isBigEndian ? tr("Big Endian") : tr("Little Endian")));
     m_format->setToolTip(isHexOffset ? tr("Hexadecimal offset and addressing")
                                      : tr("Decimal offset and addressing"));
     m_editable->setText(isReadOnly ? tr(" <b style='color: green;'>Read Only</b> ")

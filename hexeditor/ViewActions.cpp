@@ -1,5 +1,7 @@
 #include "ViewActions.h"
 
+#include "ViewResources.h"
+
 #include <QAction>
 #include <QCoreApplication>
 #include <QFile>
@@ -160,6 +162,7 @@ const QList<EditorCommand> &ViewActions::table()
 
 QIcon ViewActions::icon(const QString &path)
 {
+    initViewResources();
     QIcon result;
     if (path.isEmpty())
         return result;
