@@ -1,0 +1,120 @@
+#include "DiskBrowserModel.h"
+
+#include "NodeCore.h"
+#include "Threads/NodeTagged.h"
+
+#include <QCoreApplication>
+#include <QDeadlineTimer>
+#include <QThread>
+
+DiskBrowserModel::DiskBrowserModel(NodeCore *root, QObject *parent) : NodeModel(root, parent) {}
+
+DiskBrowserModel::~DiskBrowserModel()
+{
+    cancelAll();
+}
+
+bool DiskBrowserModel::hasChildren(const QModelIndex &parent) const
+{
+    if (parent.isValid() && parent.column() != 0)
+        return false;
+    const NodeCore *node = nodeOf(parent);
+    if (!node)
+        return false;
+    if (node->childCount() > 0)
+        return true;
+    // A folder that was never populated may have children.
+    return node->canPopulate() && !node->isPopulated();
+}
+
+bool DiskBrowserModel::canFetchMore(const QModelIndex &parent) const
+{
+    if (parent.isValid() && parent.column() != 0)
+        return false;
+    const NodeCore *node = nodeOf(parent);
+    return node && node->canPopulate() && !node->isPopulated() && !isPopulating(node);
+}
+
+bool DiskBrowserModel::isPopulating(const NodeCore *node) const
+{
+    for (const Threads::NodeTagged *w : m_workers)
+        if (w->node() == node)
+            return true;
+    return false;
+}
+
+void DiskBrowserModel::fetchMore(const QModelIndex &parent)
+{
+    NodeCore *node = nodeOf(parent);
+    if (!node || !node->canPopulate() || node->isPopulated() || isPopulating(node))
+        return;
+    if (m_synchronous) {
+        emit populationStarted(
+            node, QCoreApplication::translate("NodeCore", "Populating %1").arg(node->text(NodeAttr::Name)));
+        node->populateNow();
+        emit populationFinished(node, false);
+        return;
+    }
+    auto *worker = new Threads::NodeTagged(node, false, false, this);
+    m_workers.append(worker);
+    connect(worker, &Threads::NodeTagged::populated, this, [this, worker](NodeCore *n, bool cancelled) {
+        m_workers.removeOne(worker);
+        worker->deleteLater();
+        emit populationFinished(n, cancelled);
+    });
+    emit populationStarted(
+        node, QCoreApplication::translate("NodeCore", "Populating %1").arg(node->text(NodeAttr::Name)));
+    worker->start();
+}
+
+void DiskBrowserModel::cancelAll()
+{
+    const QList<Threads::NodeTagged *> workers = m_workers;
+    for (Threads::NodeTagged *w : workers)
+        w->cancel();
+    for (Threads::NodeTagged *w : workers)
+        w->wait();
+    for (Threads::NodeTagged *w : workers)
+        w->apply(); // a cancelled population leaves its folder unpopulated
+    for (Threads::NodeTagged *w : workers) {
+        m_workers.removeOne(w);
+        w->deleteLater();
+    }
+}
+
+bool DiskBrowserModel::waitForPopulations(int timeoutMs)
+{
+    QDeadlineTimer deadline(timeoutMs);
+    while (!m_workers.isEmpty()) {
+        if (deadline.hasExpired())
+            return false;
+        Threads::NodeTagged *w = m_workers.first();
+        w->wait(QDeadlineTimer(50));
+        if (w->isFinished())
+            w->apply(); // emits populated(): the handler takes the worker out of the list
+        QCoreApplication::processEvents();
+    }
+    return true;
+}
+
+void DiskBrowserModel::childrenAboutToBeRemoved(NodeCore *parent, int first, int last)
+{
+    // A population under a node that goes away is stopped first: its result would belong to
+    // nodes that no longer exist.
+    const QList<Threads::NodeTagged *> workers = m_workers;
+    for (Threads::NodeTagged *w : workers) {
+        for (int r = first; r <= last; ++r) {
+            NodeCore *gone = parent->child(r);
+            if (gone && gone->isAncestorOf(w->node())) {
+                w->abandon();
+                w->cancel();
+                w->wait();
+                m_workers.removeOne(w);
+                w->disconnect(this);
+                w->deleteLater();
+                break;
+            }
+        }
+    }
+    NodeModel::childrenAboutToBeRemoved(parent, first, last);
+}

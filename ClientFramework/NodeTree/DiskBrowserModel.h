@@ -1,0 +1,44 @@
+// The file browser's model ("File Browser"): a NodeModel whose folders are populated on demand.
+// fetchMore() starts a population worker (Threads::NodeTagged); its result is handed to the
+// folder on the interface thread after the worker finished, and the rows appear then.
+#pragma once
+
+#include "NodeModel.h"
+
+#include <QList>
+
+namespace Threads {
+class NodeTagged;
+}
+
+class DiskBrowserModel : public NodeModel
+{
+    Q_OBJECT
+public:
+    explicit DiskBrowserModel(NodeCore *root, QObject *parent = nullptr);
+    ~DiskBrowserModel() override;
+
+    bool hasChildren(const QModelIndex &parent = QModelIndex()) const override;
+    bool canFetchMore(const QModelIndex &parent) const override;
+    void fetchMore(const QModelIndex &parent) override;
+
+    // Populations run on a worker (default) or at once on the calling thread.
+    void setSynchronous(bool synchronous) { m_synchronous = synchronous; }
+    // Whether a population of the node is running.
+    bool isPopulating(const NodeCore *node) const;
+    // Cancels every running population and waits for the workers.
+    void cancelAll();
+    // Waits until no population is running, delivering their results (tests, shutdown).
+    bool waitForPopulations(int timeoutMs = 30000);
+
+    void childrenAboutToBeRemoved(NodeCore *parent, int first, int last) override;
+
+signals:
+    // The population of a node started / ended (cancelled or not); text is "Populating %1".
+    void populationStarted(NodeCore *node, const QString &text);
+    void populationFinished(NodeCore *node, bool cancelled);
+
+private:
+    QList<Threads::NodeTagged *> m_workers;
+    bool m_synchronous = false;
+};
