@@ -39,9 +39,9 @@ enum FieldFormat : std::uint32_t {
 // Which column of the field tree a selection is in: none (name, offset, a group or the root), the
 // primary value column or the copy value column.
 enum Context : int {
-    NoValue = 0,
-    PrimaryValue = 1,
-    CopyValue = 2,
+    ContextNone = 0,
+    ContextPrimary = 1,
+    ContextCopy = 2,
 };
 
 } // namespace HexEditor::Templates

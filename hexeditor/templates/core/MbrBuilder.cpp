@@ -92,7 +92,13 @@ void MbrBuilder::build(Record &r)
         const bool have = Values::readUnsigned(b, e + 4, 1, false, type) &&
                           Values::readUnsigned(b, e + 8, 4, false, start) &&
                           Values::readUnsigned(b, e + 12, 4, false, count);
-        const std::uint32_t kind = have ? entryKind(*r.source(), std::uint8_t(type), start, count) : 0;
+        // The partitions' contents are looked at only behind a boot record signature.
+        const bool signed55AA =
+            b.size() >= 512 && std::uint8_t(b[510]) == 0x55 && std::uint8_t(b[511]) == 0xAA;
+        std::uint32_t kind = 0;
+        if (have)
+            kind = signed55AA ? entryKind(*r.source(), std::uint8_t(type), start, count)
+                              : entryKind(*r.source(), std::uint8_t(type), 0, count);
         QString name;
         if (kind == 0) {
             name = tr("Partition %1 (Unused)").arg(n);
@@ -112,7 +118,10 @@ void MbrBuilder::build(Record &r)
         r.add(g, tr("End sector (bits 0-5), cylinder (bits 6-7)"), HexBytes, e + 6, 1);
         r.add(g, tr("End cylinder (lower 8 bits)"), HexBytes, e + 7, 1);
         const std::uint64_t target = have ? SizeMath::mul(start, bps) : SizeMath::None;
-        r.addLink(g, tr("First sector"), UInt32, e + 8, 4, target, target, kindOfFileSystem(kind, false));
+        // The protective entry of a GUID partition table points at the table's header.
+        const Type linked =
+            type == Mbr::TypeGptProtective ? GuidPartitionTable : kindOfFileSystem(kind, false);
+        r.addLink(g, tr("First sector"), UInt32, e + 8, 4, target, target, linked);
         r.add(g, tr("Total sectors"), UInt32, e + 12, 4);
     }
     r.add(nullptr, tr("Signature (55 AA)"), HexBytes, 510, 2);
