@@ -7,7 +7,10 @@
 #include <QDeadlineTimer>
 #include <QThread>
 
-DiskBrowserModel::DiskBrowserModel(NodeCore *root, QObject *parent) : NodeModel(root, parent) {}
+DiskBrowserModel::DiskBrowserModel(NodeCore *root, QObject *parent) : NodeModel(root, parent)
+{
+    qRegisterMetaType<NodeCore *>();
+}
 
 DiskBrowserModel::~DiskBrowserModel()
 {

@@ -11,6 +11,7 @@
 
 #include <QColor>
 #include <QList>
+#include <QMetaType>
 #include <QPair>
 #include <QString>
 #include <QVariant>
@@ -157,6 +158,8 @@ private:
     Counters m_counters;
     QList<INodeSubscriber *> m_subscribers;
 };
+
+Q_DECLARE_METATYPE(NodeCore *)
 
 // Intermediate base of every node kind except files and containers.
 class NodeStatic : public NodeCore

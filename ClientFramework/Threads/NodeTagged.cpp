@@ -7,6 +7,7 @@ namespace Threads {
 NodeTagged::NodeTagged(NodeCore *node, bool recursive, bool force, QObject *parent)
     : QThread(parent), m_tag(node, recursive, force)
 {
+    qRegisterMetaType<NodeCore *>();
     // The result is handed over on the thread that owns this object (the interface thread).
     connect(this, &QThread::finished, this, &NodeTagged::apply);
 }
