@@ -52,7 +52,7 @@ NodeDevice::NodeDevice(CDevice *device, NodeCore *parent) : NodeStorage(parent),
 
 NodeDevice::~NodeDevice()
 {
-    // The nodes below may point into a volume made here: they go first.
+    // The nodes below go before the node they point up to.
     qDeleteAll(childList());
     childList().clear();
 }
@@ -90,7 +90,6 @@ void NodeDevice::refreshState()
 void NodeDevice::rebuild()
 {
     clearChildren();
-    m_ownVolume.reset();
     if (!m_device || !isReady())
         return;
     const std::uint32_t count = m_device->GetPartitionCount();
@@ -98,7 +97,7 @@ void NodeDevice::rebuild()
         if (CPartition *p = m_device->GetPartition(i))
             appendChild(new NodePartition(p, int(i), this));
     if (count == 0)
-        if (CVolume *v = VolumeSource::volumeOf(m_device, m_ownVolume))
+        if (CVolume *v = VolumeSource::volumeOf(m_device))
             appendChild(new NodeDrive(v, this));
     setFlags(NodeState::Populated);
 }

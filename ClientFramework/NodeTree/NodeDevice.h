@@ -49,6 +49,4 @@ protected:
 
 private:
     CDevice *m_device = nullptr;
-    // A whole-device volume made through the volume adapter, when the kernel keeps none.
-    std::unique_ptr<CVolume> m_ownVolume;
 };

@@ -33,7 +33,7 @@ NodePartition::NodePartition(CPartition *partition, int position, NodeCore *pare
 
 NodePartition::~NodePartition()
 {
-    // The drive node points into a volume that may be owned here: it goes first.
+    // The nodes below go before the node they point up to.
     qDeleteAll(childList());
     childList().clear();
 }
@@ -48,7 +48,7 @@ void NodePartition::build()
             if (CPartition *c = m_partition->GetChildPartition(i))
                 appendChild(new NodePartition(c, int(i), this));
     } else if (!isUnallocated() && !isExtended()) {
-        m_volume = VolumeSource::volumeOf(m_partition, m_ownVolume);
+        m_volume = VolumeSource::volumeOf(m_partition);
         // A partition whose scan made slices of it is a container now.
         if (!m_volume && m_partition->GetChildCount() > 0) {
             for (std::uint32_t i = 0; i < m_partition->GetChildCount(); ++i)

@@ -47,6 +47,5 @@ private:
 
     CPartition *m_partition = nullptr;
     int m_position = 0;
-    CVolume *m_volume = nullptr;
-    std::unique_ptr<CVolume> m_ownVolume; // made through the volume adapter
+    CVolume *m_volume = nullptr; // the partition's, owned by the kernel
 };
