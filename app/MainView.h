@@ -1,7 +1,10 @@
-// The product's main window: the framework window with this product's views and commands.
+// The product's main window: the framework window with this product's views (welcome, Disk
+// Explorer, File Browser, property pane) and the handlers of the product's commands.
 #pragma once
 
 #include "ClientFramework/Views/MainView.h"
+
+#include <functional>
 
 namespace Solution {
 
@@ -11,7 +14,41 @@ class MainView : public Framework::MainView
 {
     Q_OBJECT
 public:
+    // What the window asks of the kernel side (set by start-up).
+    struct Hooks
+    {
+        // Opens an image file as a virtual disk; false when refused (the reason is logged).
+        std::function<bool(const QString &path)> mountImage;
+        // Writes the hardware-information report; false when it could not be written.
+        std::function<bool(const QString &path)> saveHardwareInfo;
+    };
+
+    static inline const QStringList GettingStarted = {
+        QStringLiteral("cmdOpen_Explorer"), QStringLiteral("cmdHex_File"), QStringLiteral("cmdOpen_Browser"),
+        QStringLiteral("cmdDI_Mount")};
+    static inline const QStringList Support = {QStringLiteral("cmdHelp"), QStringLiteral("cmdWebHelp"),
+                                               QStringLiteral("cmdWebRequest"), QStringLiteral("cmdHddInfo"),
+                                               QStringLiteral("cmdSettings")};
+
     explicit MainView(Commander *commander, QWidget *parent = nullptr);
+
+    void setHooks(Hooks hooks) { m_hooks = std::move(hooks); }
+
+    // Mounts an image file as with "Open Disk Image...": remembered in "Recent Disk &Images" when
+    // it opens.
+    bool mountImage(const QString &path);
+
+protected:
+    void registerViews() override;
+    void connectCommands() override;
+    QStringList defaultViews() const override;
+    QString initialView() const override;
+    bool restoresView(const QString &viewId) const override;
+
+private:
+    bool welcomeAtStart() const;
+
+    Hooks m_hooks;
 };
 
 } // namespace Solution

@@ -16,6 +16,7 @@
 #include "ClientFramework/Log/KernelLog.h"
 #include "ClientFramework/QuitOnSignal.h"
 #include "ClientFramework/Settings/SettingsDocument.h"
+#include "ClientFramework/Views/RecentFiles.h"
 
 #include "Kernel/Implementation/KernelVersion.h"
 #include "Kernel/Implementation/Root.h"
@@ -138,7 +139,10 @@ int Startup::run(const QStringList &argumentList, int &argc, char **argv)
         QObject::connect(action, &CLI::ProcessingAction::finalActionChosen, application.get(),
                          &Framework::Application::setFinalAction);
 
+        mainView->setHooks({[&host](const QString &path) { return host->mountImage(path); },
+                            [&host](const QString &path) { return host->saveHardwareInfo(path); }});
         mainView->build();
+        application->registerComponent(Framework::RecentFiles::SettingsElement, mainView->recentFiles());
         application->registerComponent(Framework::MainView::SettingsElement, mainView.get());
         mainView->show();
         application->initializationCompleted();

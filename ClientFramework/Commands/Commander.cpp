@@ -5,13 +5,30 @@
 #include <QAction>
 #include <QCoreApplication>
 #include <QIcon>
+#include <QMenu>
 
 namespace Core {
 
+namespace {
+Commander *theCurrent = nullptr;
+}
+
 Commander::Commander(QObject *parent) : QObject(parent)
 {
+    theCurrent = this;
     for (const CommandRecord &r : frameworkCommands())
         registerCommand(r);
+}
+
+Commander::~Commander()
+{
+    if (theCurrent == this)
+        theCurrent = nullptr;
+}
+
+Commander *Commander::current()
+{
+    return theCurrent;
 }
 
 QAction *Commander::action(const QString &id) const
@@ -26,6 +43,7 @@ void Commander::registerCommand(const CommandRecord &r)
         a = new QAction(this);
         a->setObjectName(r.id);
         m_actions.insert(r.id, a);
+        a->setEnabled(false);
     }
     auto tr = [](const QString &s) {
         QString t = QCoreApplication::translate("Core::Commander", s.toUtf8().constData());
@@ -40,6 +58,138 @@ void Commander::registerCommand(const CommandRecord &r)
         if (!path.isEmpty())
             icon.addFile(path);
     a->setIcon(icon);
+    if (m_registering) {
+        m_handled.insert(r.id);
+        a->setEnabled(ruleAllows(r.id));
+    }
+}
+
+void Commander::setHandler(const QString &id, std::function<void()> handler)
+{
+    QAction *a = action(id);
+    if (!a)
+        return;
+    if (m_connections.contains(id))
+        disconnect(m_connections.take(id));
+    if (!handler) {
+        m_handled.remove(id);
+        a->setEnabled(false);
+        return;
+    }
+    m_connections.insert(
+        id, connect(a, &QAction::triggered, this, [handler = std::move(handler)] { handler(); }));
+    m_handled.insert(id);
+    a->setEnabled(ruleAllows(id));
+}
+
+bool Commander::execute(const QString &id, const QList<NodeCore *> &nodes)
+{
+    if (nodes != m_selection)
+        setSelection(nodes);
+    if (m_features.execute(id, nodes))
+        return true;
+    QAction *a = action(id);
+    if (!a || !a->isEnabled())
+        return false;
+    a->trigger();
+    return true;
+}
+
+void Commander::setSelection(const QList<NodeCore *> &nodes)
+{
+    m_selection = nodes;
+    QList<uint32_t> states;
+    if (m_stateOf)
+        for (NodeCore *n : nodes)
+            states << (n ? m_stateOf(n) : 0u);
+    m_selectionStates = states;
+    updateEnabled();
+    m_features.updateCommands(nodes);
+    emit selectionChanged();
+}
+
+int Commander::addActions(QMenu *menu, const QStringList &ids) const
+{
+    if (!menu)
+        return 0;
+    int added = 0;
+    bool separatorDue = false;
+    for (const QString &id : ids) {
+        if (id.isEmpty()) {
+            separatorDue = true;
+            continue;
+        }
+        QAction *a = action(id);
+        if (!a)
+            continue;
+        if (separatorDue && !menu->isEmpty() && !menu->actions().constLast()->isSeparator())
+            menu->addSeparator();
+        separatorDue = false;
+        menu->addAction(a);
+        ++added;
+    }
+    return added;
+}
+
+int Commander::addFeatureCommands(QMenu *menu, const QList<NodeCore *> &nodes) const
+{
+    return addActions(menu, m_features.contextCommands(nodes));
+}
+
+void Commander::addFeature(IFeatureCommander *feature)
+{
+    if (!feature || m_features.contains(feature))
+        return;
+    m_features.append(feature);
+    m_registering = feature;
+    feature->registerCommands(*this);
+    m_registering = nullptr;
+    feature->updateCommands(m_selection);
+}
+
+void Commander::setProcessRunning(bool running)
+{
+    m_processRunning = running;
+    updateEnabled();
+}
+
+void Commander::setSelectionStates(const QList<uint32_t> &states)
+{
+    m_selectionStates = states;
+    updateEnabled();
+}
+
+bool Commander::ruleAllows(const QString &id) const
+{
+    static const QString refresh = QStringLiteral("cmdRefresh"), settings = QStringLiteral("cmdSettings"),
+                         exitApp = QStringLiteral("cmdExitApp"), stop = QStringLiteral("cmdNode_Stop"),
+                         stopAll = QStringLiteral("cmdNode_StopAll"),
+                         browse = QStringLiteral("cmdNode_Browse");
+    if (id == refresh || id == settings || id == exitApp)
+        return !m_processRunning;
+    if (id == stopAll)
+        return m_processRunning;
+    if (id == stop) {
+        if (!m_processRunning)
+            return false;
+        for (uint32_t s : m_selectionStates)
+            if (s & (StateBusy | StateWaiting))
+                return true;
+        return false;
+    }
+    if (id == browse) {
+        for (uint32_t s : m_selectionStates)
+            if (s & StateBusy)
+                return false;
+        return true;
+    }
+    return true;
+}
+
+void Commander::updateEnabled()
+{
+    for (auto it = m_actions.cbegin(); it != m_actions.cend(); ++it)
+        it.value()->setEnabled(m_handled.contains(it.key()) && ruleAllows(it.key()));
 }
 
 const QList<CommandRecord> &Commander::frameworkCommands()
