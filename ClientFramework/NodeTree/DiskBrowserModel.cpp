@@ -40,6 +40,8 @@ bool DiskBrowserModel::canFetchMore(const QModelIndex &parent) const
 
 bool DiskBrowserModel::isPopulating(const NodeCore *node) const
 {
+    if (m_queue.contains(const_cast<NodeCore *>(node)))
+        return true;
     for (const Threads::NodeTagged *w : m_workers)
         if (w->node() == node)
             return true;
@@ -58,12 +60,25 @@ void DiskBrowserModel::fetchMore(const QModelIndex &parent)
         emit populationFinished(node, false);
         return;
     }
+    m_queue.append(node);
+    startQueued();
+}
+
+void DiskBrowserModel::startQueued()
+{
+    while (m_workers.size() < MaxWorkers && !m_queue.isEmpty())
+        startWorker(m_queue.takeFirst());
+}
+
+void DiskBrowserModel::startWorker(NodeCore *node)
+{
     auto *worker = new Threads::NodeTagged(node, false, false, this);
     m_workers.append(worker);
     connect(worker, &Threads::NodeTagged::populated, this, [this, worker](NodeCore *n, bool cancelled) {
         m_workers.removeOne(worker);
         worker->deleteLater();
         emit populationFinished(n, cancelled);
+        startQueued();
     });
     emit populationStarted(
         node, QCoreApplication::translate("NodeCore", "Populating %1").arg(node->text(NodeAttr::Name)));
@@ -72,6 +87,7 @@ void DiskBrowserModel::fetchMore(const QModelIndex &parent)
 
 void DiskBrowserModel::cancelAll()
 {
+    m_queue.clear();
     const QList<Threads::NodeTagged *> workers = m_workers;
     for (Threads::NodeTagged *w : workers)
         w->cancel();
@@ -88,13 +104,17 @@ void DiskBrowserModel::cancelAll()
 bool DiskBrowserModel::waitForPopulations(int timeoutMs)
 {
     QDeadlineTimer deadline(timeoutMs);
-    while (!m_workers.isEmpty()) {
+    while (!m_workers.isEmpty() || !m_queue.isEmpty()) {
         if (deadline.hasExpired())
             return false;
+        if (m_workers.isEmpty()) {
+            startQueued();
+            continue;
+        }
         Threads::NodeTagged *w = m_workers.first();
         w->wait(QDeadlineTimer(50));
         if (w->isFinished())
-            w->apply(); // emits populated(): the handler takes the worker out of the list
+            w->apply(); // emits populated(): the handler takes the worker out and starts the next
         QCoreApplication::processEvents();
     }
     return true;
@@ -104,6 +124,12 @@ void DiskBrowserModel::childrenAboutToBeRemoved(NodeCore *parent, int first, int
 {
     // A population under a node that goes away is stopped first: its result would belong to
     // nodes that no longer exist.
+    for (int r = first; r <= last; ++r) {
+        NodeCore *gone = parent->child(r);
+        for (qsizetype i = m_queue.size() - 1; i >= 0; --i)
+            if (gone && gone->isAncestorOf(m_queue[i]))
+                m_queue.removeAt(i);
+    }
     const QList<Threads::NodeTagged *> workers = m_workers;
     for (Threads::NodeTagged *w : workers) {
         for (int r = first; r <= last; ++r) {

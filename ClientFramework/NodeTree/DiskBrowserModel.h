@@ -39,6 +39,13 @@ signals:
     void populationFinished(NodeCore *node, bool cancelled);
 
 private:
+    // Populations that run at once; the others wait in order.
+    static constexpr int MaxWorkers = 2;
+
+    void startWorker(NodeCore *node);
+    void startQueued();
+
     QList<Threads::NodeTagged *> m_workers;
+    QList<NodeCore *> m_queue;
     bool m_synchronous = false;
 };
