@@ -390,7 +390,7 @@ CDevice *MakeDevice(CRoot *root, std::unique_ptr<Volume> volume, std::uint16_t n
     DeviceInfo info;
     info.number = number;
     info.source = EnumSource::PhysicalDrive;
-    info.mediaType = MediaType::VirtualDevice;
+    info.mediaType = MediaType::RaidAssembly;
     info.ready = 1;
     info.partStyle = PartStyle::VirtualManager;
     info.sectorShift = static_cast<quint8>(SectorShift(ss));
@@ -401,11 +401,13 @@ CDevice *MakeDevice(CRoot *root, std::unique_ptr<Volume> volume, std::uint16_t n
     auto *device = new CDevice(root, info);
     device->Members() = members;
     device->SetVirtualSource(new VolumeSource(std::move(volume)));
+    device->SetAttributes(device->GetAttributes() | DeviceAttribute::Virtual | DeviceAttribute::Raid);
     return device;
 }
 
 QList<CDevice *> AssembleDevices(CRoot *root, const QList<CDevice *> &devices, std::uint16_t firstNumber,
-                                 const std::function<void(const QString &)> &message)
+                                 const std::function<void(const QString &)> &message,
+                                 const std::function<bool(std::uint16_t number)> &listed)
 {
     struct Group
     {
@@ -463,7 +465,12 @@ QList<CDevice *> AssembleDevices(CRoot *root, const QList<CDevice *> &devices, s
         for (auto &volume : Assemble(Decode(g.records, message), g.disks, message)) {
             if (number > 0xFFFF)
                 break;
-            if (CDevice *d = MakeDevice(root, std::move(volume), static_cast<std::uint16_t>(number)))
+            const auto n = static_cast<std::uint16_t>(number);
+            if (listed && listed(n)) {
+                ++number;
+                continue;
+            }
+            if (CDevice *d = MakeDevice(root, std::move(volume), n))
                 out.append(d), ++number;
         }
     }

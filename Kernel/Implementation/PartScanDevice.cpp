@@ -2,7 +2,6 @@
 #include "PartScan.h"
 
 #include "Device.h"
-#include "KernelEvents.h"
 #include "cRoot.h"
 
 namespace PartScan {
@@ -19,12 +18,10 @@ Result ScanDevice(CDevice &device, const DeviceInfo &descriptor, cRoot *root)
     in.ownSectors = descriptor.source != EnumSource::VolumeBacked || descriptor.handle != nullptr ||
                     device.GetImageHandle() != nullptr;
     in.volumes = descriptor.volumes;
-    if (root) {
+    // The partitions made here are not announced one by one: the device is not listed yet, and
+    // once it is, the root announces it (storage event 1) and then the volumes on its partitions.
+    if (root)
         in.message = [root](const QString &text) { root->EmitInternal(text); };
-        in.partitionMade = [root, &device](CPartition *) {
-            root->EmitStorage(&device, _event_storage::DeviceAdded, 0);
-        };
-    }
     return Scan(in);
 }
 

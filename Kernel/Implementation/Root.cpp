@@ -2,6 +2,7 @@
 
 #include "Device.h"
 #include "HardwareInfo.h"
+#include "LdmAssembly.h"
 #include "Platform/PlatformFile.h"
 #include "Platform/PlatformOps.h"
 #include "RootEnumSource.h"
@@ -210,18 +211,43 @@ void CRoot::InsertDevice(CDevice *device)
 
 bool CRoot::TakeDevice(CDevice *device)
 {
+    QList<CDevice *> assembled;
+    {
+        QMutexLocker guard(&m_listMutex);
+        if (!m_devices.contains(device))
+            return false;
+        for (CDevice *d : std::as_const(m_devices))
+            if (d != device && d->Members().contains(device))
+                assembled.append(d);
+    }
+    // Retired in this order, destroyed in this order: the assembled devices before their member.
+    for (CDevice *d : std::as_const(assembled))
+        TakeDevice(d);
     {
         QMutexLocker guard(&m_listMutex);
         if (!m_devices.removeOne(device))
             return false;
     }
     StorageEvent(device, _event_storage::DeviceRemoved);
-    // The device is destroyed on the root's thread after its removal has been delivered there.
+    // The device is destroyed on the root's thread after its removal has been delivered there:
+    // queued after that delivery, and destroying this device only (a device taken out later may
+    // still have its removal waiting in the queue).
     {
         QMutexLocker guard(&m_eventMutex);
         m_retired.append(device);
     }
-    QMetaObject::invokeMethod(this, &CRoot::DestroyRetired, Qt::QueuedConnection);
+    QMetaObject::invokeMethod(
+        this,
+        [this, device] {
+            bool retired = false;
+            {
+                QMutexLocker guard(&m_eventMutex);
+                retired = m_retired.removeOne(device);
+            }
+            if (retired)
+                delete device;
+        },
+        Qt::QueuedConnection);
     return true;
 }
 
@@ -278,6 +304,19 @@ CDevice *CRoot::MakeDevice(const DeviceInfo &info)
     CDevice *device = new CDevice(this, info);
     device->SetAttributes(device->GetAttributes() | BaseAttributes(info, device->GetPartStyle()));
     return device;
+}
+
+void CRoot::AssembleDynamicVolumes()
+{
+    QList<CDevice *> disks;
+    for (CDevice *d : Devices())
+        if (d->GetPartStyle() != PartStyle::VirtualManager)
+            disks.append(d);
+    const QList<CDevice *> made = LdmAssembly::AssembleDevices(
+        this, disks, DynamicVolumeFirstNumber, [this](const QString &text) { EmitInternal(text); },
+        [this](uint16_t number) { return FindDevice(number, EnumSource::PhysicalDrive, 0) != nullptr; });
+    for (CDevice *d : made)
+        InsertDevice(d);
 }
 
 bool CRoot::IsAnnounced(const CDevice *device)

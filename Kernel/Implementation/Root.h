@@ -97,6 +97,9 @@ public:
     // around it, and a device whose medium or geometry changed is replaced (events 4 and 1).
     bool RequestDeviceRefresh(CDevice *device);
 
+    // The number of the first assembled dynamic volume (physical drive numbers stay below it).
+    static constexpr uint16_t DynamicVolumeFirstNumber = 0xE000;
+
     // The attribute bits that follow from a descriptor and the device's partition style.
     static uint32_t BaseAttributes(const DeviceInfo &info, PartStyle style);
 
@@ -128,8 +131,14 @@ protected:
 
     // Inserts in device order under the device-list mutex, then announces (event 1).
     void InsertDevice(CDevice *device);
-    // Takes out under the device-list mutex, announces (event 4) and retires the device.
+    // Takes out under the device-list mutex, announces (event 4) and retires the device. A device
+    // assembled from it (a dynamic volume listing it among its members) is taken out first, so no
+    // assembled device outlives a member it reads through.
     bool TakeDevice(CDevice *device);
+    // Assembles the dynamic volumes of the listed disks of every logical-disk-manager disk group as
+    // virtual devices (partition style 6, media type 7) numbered from DynamicVolumeFirstNumber and
+    // adds those not yet listed (same number, source and sub).
+    void AssembleDynamicVolumes();
     // One refresh pass (run by the enumeration thread): close all handles, enumerate, remove what
     // vanished or is excluded, add what appeared; events 0 and 5 around it.
     void RunRefresh(bool full, const RefreshKinds &kinds);

@@ -97,6 +97,8 @@ void CRoot::RunRefresh(bool full, const RefreshKinds &kinds)
         if (device)
             InsertDevice(device);
     }
+    // Dynamic volumes over the disks now listed; those already assembled stay as they are.
+    AssembleDynamicVolumes();
     m_refreshed = true;
     StorageEvent(nullptr, _event_storage::EnumerationCompleted);
 }
@@ -128,6 +130,8 @@ void CRoot::RunDeviceRefresh(CDevice *device)
         CDevice *replacement = MakeDevice(fresh);
         if (replacement)
             InsertDevice(replacement);
+        // The dynamic volumes that went with the old medium come back when the new one has them.
+        AssembleDynamicVolumes();
     } else if (found) {
         delete fresh.handle;
     }

@@ -145,7 +145,7 @@ TEST(RaidLdmAssembly, SpannedVolumeReadsThroughAVirtualDevice)
     std::unique_ptr<CDevice> device(LdmAssembly::MakeDevice(nullptr, std::move(volumes[0]), 40));
     ASSERT_TRUE(device);
     EXPECT_EQ(device->GetPartStyle(), PartStyle::VirtualManager);
-    EXPECT_EQ(device->GetMediaType(), MediaType::VirtualDevice);
+    EXPECT_EQ(device->GetMediaType(), MediaType::RaidAssembly);
     EXPECT_EQ(device->GetTotalSectors(), 80u);
     bool ok = false;
     EXPECT_EQ(ReadVolume(*device, 45, 10, &ok), ExpectedSectors(45, 10));

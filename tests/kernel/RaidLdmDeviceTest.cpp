@@ -1,169 +1,190 @@
 // Two dynamic disks of one disk group, built sector by sector on a scripted machine, enumerated by
-// the kernel root; their spanned volume is assembled as a virtual device and read end to end.
+// the kernel root: the refresh assembles their spanned volume as a virtual device, keeps it across
+// refreshes, and takes it out before a member disk that leaves.
 #include <gtest/gtest.h>
+
+#include <QCoreApplication>
+#include <QThread>
 
 #include <memory>
 
 #include "Kernel/Implementation/Device.h"
+#include "Kernel/Implementation/FS/Volume.h"
 #include "Kernel/Implementation/LdmAssembly.h"
 #include "Kernel/Implementation/Root.h"
-#include "RaidTestStorage.h"
-#include "RootTestSupport.h"
+#include "LdmTestDisks.h"
+
+using namespace LdmTestDisks;
 
 namespace {
 
-constexpr std::uint64_t Total = 16384;
-constexpr std::uint64_t ConfigStart = Total - 2048;
-constexpr std::uint64_t DataStart = 63;
-const char *GroupGuid = "1a2b3c4d-1111-2222-3333-444455556666";
-const char *GroupName = "Dsk1Dg0";
-
-void Be(QByteArray &b, int offset, std::uint64_t v, int bytes)
+struct Event
 {
-    for (int i = bytes - 1; i >= 0; --i, v >>= 8)
-        b[offset + i] = char(v & 0xFF);
-}
+    uint32_t code;
+    CDevice *device;
+    QString model; // read on delivery: the device must still exist then
+    bool volume;   // a kernelVolume event
+};
 
-QByteArray Num(std::uint64_t v)
-{
-    QByteArray digits;
-    while (v) {
-        digits.prepend(char(v & 0xFF));
-        v >>= 8;
-    }
-    return char(digits.size()) + digits;
-}
-
-QByteArray Txt(const QByteArray &t)
-{
-    return char(t.size()) + t;
-}
-
-QByteArray DiskGuid(int n)
-{
-    return QByteArray("9f8e7d6c-aaaa-bbbb-cccc-ddddeeeeff0") + QByteArray::number(n);
-}
-
-// The database every disk of the group carries: group, two disks, a spanned volume of 100 sectors
-// on each disk.
-QByteArray Database()
-{
-    QList<QPair<QPair<int, int>, QByteArray>> records; // (type, flags), body
-    records.append({{0x35, 0}, Num(0x101) + Txt(GroupName) + Txt(GroupGuid)});
-    records.append({{0x34, 0}, Num(0x102) + Txt("Disk1") + Txt(DiskGuid(1))});
-    records.append({{0x34, 0}, Num(0x103) + Txt("Disk2") + Txt(DiskGuid(2))});
-    records.append({{0x51, 0}, Num(0x104) + Txt("Volume1") + Txt("gen") + Txt("") + Txt("ACTIVE")});
-    records.append({{0x32, 0},
-                    Num(0x105) + Txt("Volume1-01") + Txt("ACTIVE") + char(2) + QByteArray(4, '\0') + Num(2) +
-                        QByteArray(16, '\0') + Num(0x104) + QByteArray(1, '\0')});
-    for (int disk = 0; disk < 2; ++disk) {
-        QByteArray start(8, '\0'), offset(8, '\0');
-        Be(start, 0, 0, 8);
-        Be(offset, 0, 100 * disk, 8);
-        records.append({{0x33, 0},
-                        Num(0x106 + disk) + Txt("Disk-01") + QByteArray(12, '\0') + start + offset +
-                            Num(100) + Num(0x105) + Num(0x102 + disk)});
-    }
-    QByteArray db(512 + 128 * int(records.size()), '\0');
-    db.replace(0, 4, "VMDB");
-    Be(db, 4, 4 + records.size(), 4);
-    Be(db, 8, 128, 4);
-    Be(db, 12, 512, 4);
-    Be(db, 0x10, 1, 2);
-    Be(db, 0x12, 4, 2);
-    Be(db, 0x14, 10, 2);
-    db.replace(0x16, 7, GroupName);
-    db.replace(0x35, 36, GroupGuid);
-    for (int i = 0; i < records.size(); ++i) {
-        QByteArray r(128, '\0');
-        r.replace(0, 4, "VBLK");
-        Be(r, 4, 4 + i, 4);
-        Be(r, 8, i + 1, 4);
-        Be(r, 14, 1, 2);
-        r[0x12] = char(records[i].first.second);
-        r[0x13] = char(records[i].first.first);
-        Be(r, 0x14, records[i].second.size(), 4);
-        r.replace(0x18, records[i].second.size(), records[i].second);
-        db.replace(512 + i * 128, 128, r);
-    }
-    return db;
-}
-
-QByteArray DynamicDisk(int n)
-{
-    QByteArray d = RootTest::Disk(Total * 512, true);
-    auto put = [&](std::uint64_t sector, const QByteArray &bytes) {
-        d.replace(qsizetype(sector * 512), bytes.size(), bytes);
-    };
-    QByteArray mbr(16, '\0');
-    mbr[4] = char(0x42);
-    Be(mbr, 8, 0, 4);
-    for (int i = 0; i < 4; ++i)
-        mbr[8 + i] = char((DataStart >> (8 * i)) & 0xFF),
-                mbr[12 + i] = char(((Total - DataStart) >> (8 * i)) & 0xFF);
-    put(0, QByteArray(d.mid(0, 446)) + mbr + QByteArray(48, '\0') + QByteArray("\x55\xAA", 2));
-
-    QByteArray ph(512, '\0');
-    ph.replace(0, 8, "PRIVHEAD");
-    Be(ph, 12, 2, 2);
-    Be(ph, 14, 12, 2);
-    ph.replace(0x30, 36, DiskGuid(n));
-    ph.replace(0xB0, 36, GroupGuid);
-    ph.replace(0xF0, 7, GroupName);
-    Be(ph, 0x11B, DataStart, 8);
-    Be(ph, 0x123, ConfigStart - DataStart, 8);
-    Be(ph, 0x12B, ConfigStart, 8);
-    Be(ph, 0x133, 2048, 8);
-    Be(ph, 8, Ldm::checksum(ph, Ldm::PrivHeadBytes), 4);
-    put(Total - 1, ph);
-
-    QByteArray toc(512, '\0');
-    toc.replace(0, 8, "TOCBLOCK");
-    toc.replace(0x24, 6, "config");
-    Be(toc, 0x2E, 17, 8);
-    Be(toc, 0x36, 1000, 8);
-    toc.replace(0x46, 3, "log");
-    Be(toc, 0x50, 1100, 8);
-    Be(toc, 0x58, 200, 8);
-    Be(toc, 8, Ldm::checksum(toc, Ldm::TocBlockBytes), 4);
-    put(ConfigStart + 1, toc);
-    put(ConfigStart + 17, Database());
-
-    // Volume sectors: disk 1 holds 0..99, disk 2 holds 100..199, from the data area's start.
-    for (std::uint64_t s = 0; s < 100; ++s) {
-        QByteArray sector(512, '\0');
-        RaidTest::FillSector(reinterpret_cast<std::uint8_t *>(sector.data()), s + 100 * (n - 1));
-        put(DataStart + s, sector);
-    }
-    return d;
-}
-
-} // namespace
-
-TEST(RaidLdmDevice, SpannedVolumeOfTwoEnumeratedDisks)
+struct LdmMachine
 {
     ScriptedBackend backend;
     RootTest::FakeSource source;
-    RootTest::AnswerGeometry(backend, 512, DeviceControl::PARTITION_STYLE_MBR, Total * 512);
-    backend.AddFile("/dev/sda", DynamicDisk(1));
-    backend.AddFile("/dev/sdb", DynamicDisk(2));
-    source.Set({RootTest::Candidate("/dev/sda", 0, EnumSource::PhysicalDrive, Total * 512),
-                RootTest::Candidate("/dev/sdb", 1, EnumSource::PhysicalDrive, Total * 512)});
-    CRoot root(&backend, &source);
-    ASSERT_TRUE(root.RefreshAndWait());
-    ASSERT_EQ(root.GetDeviceCount(), 2u);
+    std::unique_ptr<CRoot> root;
+    QList<Event> events;
 
-    QStringList messages;
-    QList<CDevice *> made =
-        LdmAssembly::AssembleDevices(&root, root.Devices(), 100, [&](const QString &t) { messages << t; });
-    ASSERT_EQ(made.size(), 1) << messages.join('\n').toStdString();
-    std::unique_ptr<CDevice> volume(made.first());
+    LdmMachine()
+    {
+        RootTest::AnswerGeometry(backend, 512, DeviceControl::PARTITION_STYLE_MBR, Total * 512);
+        backend.AddFile("/dev/sda", DynamicDisk(1));
+        backend.AddFile("/dev/sdb", DynamicDisk(2));
+        source.Set({Disk(0), Disk(1)});
+        root = std::make_unique<CRoot>(&backend, &source);
+        QObject::connect(root.get(), &cRoot::kernelStorage, root.get(), [this](const _event_storage &e) {
+            if (e.device)
+                events.append({e.code, e.device, e.device->GetModel(), false});
+        });
+        QObject::connect(root.get(), &cRoot::kernelVolume, root.get(), [this](const _event_volume &e) {
+            events.append({e.code, e.device, e.volume->GetDisplayName(), true});
+        });
+    }
+
+    static EnumCandidate Disk(int n)
+    {
+        return RootTest::Candidate(n ? "/dev/sdb" : "/dev/sda", quint16(n), EnumSource::PhysicalDrive,
+                                   Total * 512);
+    }
+
+    CDevice *Assembled()
+    {
+        for (CDevice *d : root->Devices())
+            if (d->GetPartStyle() == PartStyle::VirtualManager)
+                return d;
+        return nullptr;
+    }
+
+    void Settle()
+    {
+        root->WaitForEnumeration();
+        QCoreApplication::processEvents();
+    }
+};
+
+} // namespace
+
+TEST(RaidLdmDevice, RefreshAssemblesTheSpannedVolumeOnce)
+{
+    LdmMachine m;
+    ASSERT_TRUE(m.root->RefreshAndWait());
+    m.Settle();
+    ASSERT_EQ(m.root->GetDeviceCount(), 3u);
+    CDevice *volume = m.Assembled();
+    ASSERT_TRUE(volume);
+    // Listed after the disks it is made of.
+    EXPECT_EQ(m.root->GetDevice(2), volume);
+    const DeviceInfo &info = volume->GetDescriptor();
+    EXPECT_EQ(info.number, CRoot::DynamicVolumeFirstNumber);
+    EXPECT_EQ(info.source, EnumSource::PhysicalDrive);
+    EXPECT_EQ(info.sub, 0);
+    EXPECT_EQ(volume->GetMediaType(), MediaType::RaidAssembly);
     EXPECT_EQ(volume->GetTotalSectors(), 200u);
-    EXPECT_EQ(volume->GetPartStyle(), PartStyle::VirtualManager);
     EXPECT_EQ(volume->Members().size(), 2);
+    EXPECT_TRUE(volume->GetAttributes() & DeviceAttribute::Raid);
     EXPECT_TRUE(volume->GetModel().contains("Volume1")) << volume->GetModel().toStdString();
+    EXPECT_TRUE(m.root->IsAnnounced(volume));
+    // A device without partitions: one volume over all of it, made once its sectors could be read.
+    ASSERT_TRUE(volume->Volume());
+    EXPECT_TRUE(volume->Volume()->IsReady());
     QByteArray all(200 * 512, '\0');
     std::uint32_t error = 0;
     EXPECT_TRUE(volume->ReadSectors(0, 200, all.data(), error));
     EXPECT_EQ(all, RaidTest::ExpectedSectors(0, 200));
+
+    // Refreshes keep the device as it is and announce nothing again.
+    m.events.clear();
+    ASSERT_TRUE(m.root->RefreshAndWait());
+    m.Settle();
+    ASSERT_TRUE(m.root->RefreshAndWait());
+    m.Settle();
+    EXPECT_EQ(m.root->GetDeviceCount(), 3u);
+    EXPECT_EQ(m.Assembled(), volume);
+    EXPECT_TRUE(m.events.isEmpty());
+    // Nothing was written to either disk.
+    EXPECT_EQ(m.backend.CallCount("write"), 0);
+}
+
+TEST(RaidLdmDevice, AMemberThatLeavesTakesTheAssemblyFirst)
+{
+    LdmMachine m;
+    ASSERT_TRUE(m.root->RefreshAndWait());
+    m.Settle();
+    CDevice *volume = m.Assembled();
+    ASSERT_TRUE(volume);
+    CDevice *second = m.root->GetDevice(1);
+    ASSERT_TRUE(volume->Members().contains(second));
+
+    m.events.clear();
+    m.source.Set({LdmMachine::Disk(0)});
+    m.backend.Vanish("/dev/sdb");
+    ASSERT_TRUE(m.root->RefreshAndWait());
+    m.Settle();
+    // A spanned volume does not assemble with one disk: only the first disk is left.
+    ASSERT_EQ(m.root->GetDeviceCount(), 1u);
+    EXPECT_FALSE(m.Assembled());
+    // The assembly's volume and the assembly leave first, then the member's volumes and the member,
+    // each delivered while it still existed.
+    ASSERT_GE(m.events.size(), 3);
+    EXPECT_TRUE(m.events[0].volume);
+    EXPECT_EQ(m.events[0].device, volume);
+    QList<CDevice *> devices;
+    for (const Event &e : m.events) {
+        EXPECT_EQ(e.code, 4u);
+        if (!e.volume)
+            devices << e.device;
+    }
+    EXPECT_EQ(devices, (QList<CDevice *>{volume, second}));
+
+    // The disk comes back (under another name): the volume is assembled again, same number.
+    m.events.clear();
+    m.backend.AddFile("/dev/sdc", DynamicDisk(2));
+    m.source.Set(
+        {LdmMachine::Disk(0), RootTest::Candidate("/dev/sdc", 1, EnumSource::PhysicalDrive, Total * 512)});
+    ASSERT_TRUE(m.root->RefreshAndWait());
+    m.Settle();
+    ASSERT_EQ(m.root->GetDeviceCount(), 3u);
+    ASSERT_TRUE(m.Assembled());
+    EXPECT_EQ(m.Assembled()->GetDescriptor().number, CRoot::DynamicVolumeFirstNumber);
+}
+
+TEST(RaidLdmDevice, RemovingAMemberByHandRemovesTheAssemblyToo)
+{
+    LdmMachine m;
+    ASSERT_TRUE(m.root->RefreshAndWait());
+    m.Settle();
+    ASSERT_TRUE(m.Assembled());
+    CDevice *first = m.root->GetDevice(0);
+    EXPECT_TRUE(m.root->RemoveDevice(first));
+    QCoreApplication::processEvents();
+    EXPECT_EQ(m.root->GetDeviceCount(), 1u);
+    EXPECT_FALSE(m.Assembled());
+}
+
+TEST(RaidLdmDevice, AssembleDevicesSkipsListedNumbers)
+{
+    LdmMachine m;
+    ASSERT_TRUE(m.root->RefreshAndWait());
+    m.Settle();
+    QList<CDevice *> disks;
+    for (CDevice *d : m.root->Devices())
+        if (d->GetPartStyle() != PartStyle::VirtualManager)
+            disks << d;
+    QStringList messages;
+    const auto note = [&](const QString &t) { messages << t; };
+    QList<CDevice *> made = LdmAssembly::AssembleDevices(m.root.get(), disks, 100, note);
+    ASSERT_EQ(made.size(), 1) << messages.join('\n').toStdString();
+    std::unique_ptr<CDevice> again(made.first());
+    EXPECT_EQ(again->GetDescriptor().number, 100);
+    EXPECT_TRUE(LdmAssembly::AssembleDevices(m.root.get(), disks, 100, note, [](std::uint16_t n) {
+                    return n == 100;
+                }).isEmpty());
 }

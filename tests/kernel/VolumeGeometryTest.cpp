@@ -229,39 +229,6 @@ TEST(VolumePartitioned, VolumesInsideMbrAndGptDisks)
     }
 }
 
-// A BSD disk label in sector 1 of a UFS partition, with slice 'a' over the whole partition.
-QByteArray BsdLabel(std::uint32_t sectors)
-{
-    QByteArray l(512, 0);
-    auto put32 = [&l](int at, std::uint32_t v) {
-        for (int i = 0; i < 4; ++i)
-            l[at + i] = static_cast<char>(v >> (8 * i));
-    };
-    auto put16 = [&l](int at, std::uint16_t v) {
-        l[at] = static_cast<char>(v);
-        l[at + 1] = static_cast<char>(v >> 8);
-    };
-    put32(0, 0x82564557u);
-    put32(40, 512);
-    put32(60, sectors);
-    put32(132, 0x82564557u);
-    put16(138, 3);
-    put32(148 + 0, sectors - 64); // a: UFS
-    put32(148 + 4, 0);
-    l[148 + 12] = 7;
-    put32(148 + 16 + 0, 64); // b: swap at the end
-    put32(148 + 16 + 4, sectors - 64);
-    l[148 + 16 + 12] = 1;
-    put32(148 + 32 + 0, sectors); // c: the whole partition
-    l[148 + 32 + 12] = 0;
-    std::uint16_t sum = 0;
-    for (int i = 0; i < 148 + 3 * 16; i += 2)
-        sum ^= static_cast<std::uint16_t>(static_cast<std::uint8_t>(l[i]) |
-                                          (static_cast<std::uint8_t>(l[i + 1]) << 8));
-    put16(136, sum);
-    return l;
-}
-
 TEST(VolumeBsd, LabelledUfsPartitionBecomesAContainer)
 {
     const VolumeImages::Made m = VolumeImages::Get("ufs1");
@@ -271,7 +238,7 @@ TEST(VolumeBsd, LabelledUfsPartitionBecomesAContainer)
     ASSERT_TRUE(f.open(QIODevice::ReadOnly));
     QByteArray bytes = f.readAll();
     const std::uint32_t sectors = static_cast<std::uint32_t>(bytes.size() / 512);
-    bytes.replace(512, 512, BsdLabel(sectors));
+    bytes.replace(512, 512, VolumeImages::BsdLabel(sectors));
     MemoryStorage storage(bytes);
     CPartition partition(nullptr, &storage, nullptr, 24, 0, sectors);
     std::vector<CPartition *> slices;

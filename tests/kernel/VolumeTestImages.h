@@ -188,4 +188,37 @@ inline bool Wipe(const QString &path, qint64 offset, qint64 length)
     return f.write(QByteArray(length, 0)) == length;
 }
 
+// A BSD disk label in sector 1 of a UFS partition, with slice 'a' over the whole partition.
+inline QByteArray BsdLabel(std::uint32_t sectors)
+{
+    QByteArray l(512, 0);
+    auto put32 = [&l](int at, std::uint32_t v) {
+        for (int i = 0; i < 4; ++i)
+            l[at + i] = static_cast<char>(v >> (8 * i));
+    };
+    auto put16 = [&l](int at, std::uint16_t v) {
+        l[at] = static_cast<char>(v);
+        l[at + 1] = static_cast<char>(v >> 8);
+    };
+    put32(0, 0x82564557u);
+    put32(40, 512);
+    put32(60, sectors);
+    put32(132, 0x82564557u);
+    put16(138, 3);
+    put32(148 + 0, sectors - 64); // a: UFS
+    put32(148 + 4, 0);
+    l[148 + 12] = 7;
+    put32(148 + 16 + 0, 64); // b: swap at the end
+    put32(148 + 16 + 4, sectors - 64);
+    l[148 + 16 + 12] = 1;
+    put32(148 + 32 + 0, sectors); // c: the whole partition
+    l[148 + 32 + 12] = 0;
+    std::uint16_t sum = 0;
+    for (int i = 0; i < 148 + 3 * 16; i += 2)
+        sum ^= static_cast<std::uint16_t>(static_cast<std::uint8_t>(l[i]) |
+                                          (static_cast<std::uint8_t>(l[i + 1]) << 8));
+    put16(136, sum);
+    return l;
+}
+
 } // namespace VolumeImages
