@@ -1,11 +1,14 @@
 // A byte range of a hex-editor storage: the payload of the editor's data-change notifications.
 #pragma once
 
+#include <QMetaType>
+
 #include <cstdint>
 
 namespace HexEditor {
 
-struct DiskArea {
+struct DiskArea
+{
     uint64_t offset = 0;
     uint64_t length = 0;
 
@@ -17,3 +20,5 @@ struct DiskArea {
 };
 
 } // namespace HexEditor
+
+Q_DECLARE_METATYPE(HexEditor::DiskArea)

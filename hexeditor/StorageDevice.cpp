@@ -1,0 +1,15 @@
+#include "StorageDevice.h"
+
+#include "Kernel/Implementation/cDevice.h"
+#include "StorageNavigation.h"
+
+namespace HexEditor {
+
+StorageDevice::StorageDevice(cDevice *device, QObject *parent) : Storage(device, parent), m_device(device) {}
+
+QList<NavigationPoint> StorageDevice::buildNavigationPoints()
+{
+    return m_device ? Navigation::devicePoints(*m_device) : QList<NavigationPoint>();
+}
+
+} // namespace HexEditor
