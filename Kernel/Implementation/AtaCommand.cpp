@@ -1,30 +1,14 @@
 #include "AtaCommand.h"
 
+#include "ByteOrder.h"
+
 #include <cstring>
 
 namespace Ata {
 
-namespace {
-
-void put16(std::uint8_t *p, std::uint16_t v)
-{
-    p[0] = std::uint8_t(v);
-    p[1] = std::uint8_t(v >> 8);
-}
-
-void put32(std::uint8_t *p, std::uint32_t v)
-{
-    for (int i = 0; i < 4; ++i)
-        p[i] = std::uint8_t(v >> (8 * i));
-}
-
-void put64(std::uint8_t *p, std::uint64_t v)
-{
-    for (int i = 0; i < 8; ++i)
-        p[i] = std::uint8_t(v >> (8 * i));
-}
-
-} // namespace
+using ByteOrder::putLe16;
+using ByteOrder::putLe32;
+using ByteOrder::putLe64;
 
 Request BuildRequest(const Command &command, const std::uint8_t *dataOut)
 {
@@ -40,11 +24,11 @@ Request BuildRequest(const Command &command, const std::uint8_t *dataOut)
         flags |= Flag::Command48Bit;
     const bool withData = command.direction != Direction::None;
 
-    put16(h + Offset::Length, HeaderSize);
-    put16(h + Offset::Flags, flags);
-    put32(h + Offset::TransferLength, withData ? DataSize : 0);
-    put32(h + Offset::TimeOut, command.timeOutSeconds);
-    put64(h + Offset::DataBufferOffset, HeaderSize);
+    putLe16(h + Offset::Length, HeaderSize);
+    putLe16(h + Offset::Flags, flags);
+    putLe32(h + Offset::TransferLength, withData ? DataSize : 0);
+    putLe32(h + Offset::TimeOut, command.timeOutSeconds);
+    putLe64(h + Offset::DataBufferOffset, HeaderSize);
 
     std::uint8_t *cur = h + Offset::CurrentTaskFile;
     cur[Reg::Features] = command.features;

@@ -1,5 +1,7 @@
 #include "AtaIdentify.h"
 
+#include "ByteOrder.h"
+
 #include <QByteArray>
 #include <cstring>
 
@@ -9,7 +11,7 @@ std::uint16_t Word(const std::uint8_t *block, unsigned index)
 {
     if (index >= Size / 2)
         return 0;
-    return std::uint16_t(block[2 * index] | block[2 * index + 1] << 8);
+    return ByteOrder::le16(block + 2 * index);
 }
 
 bool AllZero(const std::uint8_t *data, std::size_t size)

@@ -1,5 +1,6 @@
 #include "LdmAssembly.h"
 
+#include "ByteOrder.h"
 #include "Device.h"
 #include "DeviceVirtualSource.h"
 #include "Partition.h"
@@ -36,9 +37,7 @@ public:
         const int n = Byte();
         if (n > 8 || !Need(n))
             return Fail();
-        std::uint64_t v = 0;
-        for (int i = 0; i < n; ++i)
-            v = (v << 8) | static_cast<std::uint8_t>(m_b[m_pos + i]);
+        const std::uint64_t v = ByteOrder::readBe(m_b, m_pos, n);
         m_pos += n;
         return v;
     }
@@ -63,14 +62,7 @@ public:
         m_pos += n;
         return r;
     }
-    std::uint64_t Fixed64()
-    {
-        const QByteArray b = Bytes(8);
-        std::uint64_t v = 0;
-        for (char c : b)
-            v = (v << 8) | static_cast<std::uint8_t>(c);
-        return v;
-    }
+    std::uint64_t Fixed64() { return ByteOrder::readBe(Bytes(8), 0, 8); }
     int Byte()
     {
         if (!Need(1))

@@ -3,13 +3,14 @@
 #include <map>
 #include <set>
 
+#include "ByteOrder.h"
 #include "PartScanBytes.h"
 
 namespace Ldm {
 
-using PartScan::be16;
-using PartScan::be32;
-using PartScan::be64;
+using ByteOrder::be16;
+using ByteOrder::be32;
+using ByteOrder::be64;
 using PartScan::hasText;
 
 namespace {
@@ -75,7 +76,7 @@ public:
         const int n = byte();
         if (n > 8 || !need(n))
             return fail();
-        const std::uint64_t v = n == 0 ? 0 : PartScan::readBe(m_b, m_pos, n);
+        const std::uint64_t v = n == 0 ? 0 : ByteOrder::readBe(m_b, m_pos, n);
         m_pos += n;
         return v;
     }

@@ -16,8 +16,8 @@ bool Entry::isValid() const
 {
     if (start() == 0)
         return isZero();
-    const std::uint16_t chsStart = static_cast<std::uint16_t>(raw[2] | raw[3] << 8);
-    const std::uint16_t chsEnd = static_cast<std::uint16_t>(raw[6] | raw[7] << 8);
+    const std::uint16_t chsStart = ByteOrder::le16(raw.data() + 2);
+    const std::uint16_t chsEnd = ByteOrder::le16(raw.data() + 6);
     return chsStart != 0 && type() != 0 && chsEnd != 0 && count() != 0;
 }
 
@@ -29,7 +29,7 @@ Table parse(const QByteArray &sector)
     const auto *p = reinterpret_cast<const std::uint8_t *>(sector.constData());
     for (int i = 0; i < EntryCount; ++i)
         std::memcpy(t.entries[i].raw.data(), p + EntryOffset + i * EntrySize, EntrySize);
-    t.diskSignature = p[440] | p[441] << 8 | p[442] << 16 | std::uint32_t(p[443]) << 24;
+    t.diskSignature = ByteOrder::le32(p + 440);
     return t;
 }
 
@@ -40,7 +40,7 @@ void sortEntries(QByteArray &sector)
     auto *p = reinterpret_cast<std::uint8_t *>(sector.data()) + EntryOffset;
     auto startOf = [p](int i) {
         const std::uint8_t *e = p + i * EntrySize;
-        return e[8] | e[9] << 8 | e[10] << 16 | std::uint32_t(e[11]) << 24;
+        return ByteOrder::le32(e + 8);
     };
     for (int i = 0; i < EntryCount - 1; ++i) {
         int min = i;

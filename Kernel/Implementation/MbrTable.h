@@ -7,6 +7,8 @@
 #include <array>
 #include <cstdint>
 
+#include "ByteOrder.h"
+
 namespace Mbr {
 
 constexpr int EntryOffset = 446;
@@ -25,14 +27,8 @@ struct Entry
 
     std::uint8_t bootIndicator() const { return raw[0]; }
     std::uint8_t type() const { return raw[4]; }
-    std::uint32_t start() const
-    {
-        return raw[8] | raw[9] << 8 | raw[10] << 16 | std::uint32_t(raw[11]) << 24;
-    }
-    std::uint32_t count() const
-    {
-        return raw[12] | raw[13] << 8 | raw[14] << 16 | std::uint32_t(raw[15]) << 24;
-    }
+    std::uint32_t start() const { return ByteOrder::le32(raw.data() + 8); }
+    std::uint32_t count() const { return ByteOrder::le32(raw.data() + 12); }
     bool isExtended() const { return type() == TypeExtendedChs || type() == TypeExtendedLba; }
     bool isZero() const;
     // An entry with a starting sector needs its CHS sector/cylinder words, its type and its count

@@ -1,5 +1,7 @@
 #include "RootIdentity.h"
 
+#include "ByteOrder.h"
+
 #include <QByteArray>
 
 #include <cstring>
@@ -10,12 +12,12 @@ namespace {
 
 uint16_t Word(const uint8_t *block, int index)
 {
-    return uint16_t(block[index * 2] | (block[index * 2 + 1] << 8));
+    return ByteOrder::le16(block + index * 2);
 }
 
 uint32_t U32(const uint8_t *p)
 {
-    return uint32_t(p[0]) | (uint32_t(p[1]) << 8) | (uint32_t(p[2]) << 16) | (uint32_t(p[3]) << 24);
+    return ByteOrder::le32(p);
 }
 
 // The raw characters of an identify string field in memory order, cut at a zero byte.

@@ -1,62 +1,24 @@
-// Bounds-checked readers of little- and big-endian integers in on-disk buffers. A field that
-// does not lie wholly inside the buffer reads as 0.
+// Bounds-checked field reads for the file-system probes: the byte-order readers of ByteOrder.h
+// (a field that does not lie wholly inside the buffer reads as 0), text and range checks.
 #pragma once
 
 #include <cstddef>
 #include <cstdint>
 #include <cstring>
 
+#include "../ByteOrder.h"
+
 namespace DiskBytes {
 
-inline bool Fits(std::size_t size, std::size_t offset, std::size_t length)
-{
-    return offset <= size && length <= size - offset;
-}
-
-template <typename T> inline T LE(const std::uint8_t *buf, std::size_t size, std::size_t offset)
-{
-    if (!buf || !Fits(size, offset, sizeof(T)))
-        return 0;
-    T v = 0;
-    for (std::size_t i = 0; i < sizeof(T); ++i)
-        v |= static_cast<T>(static_cast<T>(buf[offset + i]) << (8 * i));
-    return v;
-}
-
-template <typename T> inline T BE(const std::uint8_t *buf, std::size_t size, std::size_t offset)
-{
-    if (!buf || !Fits(size, offset, sizeof(T)))
-        return 0;
-    T v = 0;
-    for (std::size_t i = 0; i < sizeof(T); ++i)
-        v = static_cast<T>((v << 8) | buf[offset + i]);
-    return v;
-}
-
-inline std::uint16_t U16(const std::uint8_t *b, std::size_t s, std::size_t o)
-{
-    return LE<std::uint16_t>(b, s, o);
-}
-inline std::uint32_t U32(const std::uint8_t *b, std::size_t s, std::size_t o)
-{
-    return LE<std::uint32_t>(b, s, o);
-}
-inline std::uint64_t U64(const std::uint8_t *b, std::size_t s, std::size_t o)
-{
-    return LE<std::uint64_t>(b, s, o);
-}
-inline std::uint16_t B16(const std::uint8_t *b, std::size_t s, std::size_t o)
-{
-    return BE<std::uint16_t>(b, s, o);
-}
-inline std::uint32_t B32(const std::uint8_t *b, std::size_t s, std::size_t o)
-{
-    return BE<std::uint32_t>(b, s, o);
-}
-inline std::uint64_t B64(const std::uint8_t *b, std::size_t s, std::size_t o)
-{
-    return BE<std::uint64_t>(b, s, o);
-}
+using ByteOrder::B16;
+using ByteOrder::B32;
+using ByteOrder::B64;
+using ByteOrder::BE;
+using ByteOrder::Fits;
+using ByteOrder::LE;
+using ByteOrder::U16;
+using ByteOrder::U32;
+using ByteOrder::U64;
 
 // The bytes at offset equal `text` (length bytes); false when they do not fit.
 inline bool Equals(const std::uint8_t *buf, std::size_t size, std::size_t offset, const char *text,

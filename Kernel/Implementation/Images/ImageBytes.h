@@ -1,53 +1,24 @@
-// Reading and writing integers of a fixed byte order in image structures.
+// Integers of a fixed byte order in image structures (the readers and writers of ByteOrder.h) and
+// the small checks the image parsers share.
 #pragma once
 
 #include <cstddef>
 #include <cstdint>
 
+#include "../ByteOrder.h"
+
 namespace ImageBytes {
 
-inline std::uint16_t le16(const std::uint8_t *p)
-{
-    return std::uint16_t(p[0] | (p[1] << 8));
-}
-inline std::uint32_t le32(const std::uint8_t *p)
-{
-    return std::uint32_t(p[0]) | (std::uint32_t(p[1]) << 8) | (std::uint32_t(p[2]) << 16) |
-           (std::uint32_t(p[3]) << 24);
-}
-inline std::uint64_t le64(const std::uint8_t *p)
-{
-    return std::uint64_t(le32(p)) | (std::uint64_t(le32(p + 4)) << 32);
-}
-inline std::uint32_t be32(const std::uint8_t *p)
-{
-    return (std::uint32_t(p[0]) << 24) | (std::uint32_t(p[1]) << 16) | (std::uint32_t(p[2]) << 8) |
-           std::uint32_t(p[3]);
-}
-inline std::uint64_t be64(const std::uint8_t *p)
-{
-    return (std::uint64_t(be32(p)) << 32) | be32(p + 4);
-}
-inline void putLe32(std::uint8_t *p, std::uint32_t v)
-{
-    for (int i = 0; i < 4; ++i)
-        p[i] = std::uint8_t(v >> (8 * i));
-}
-inline void putLe64(std::uint8_t *p, std::uint64_t v)
-{
-    for (int i = 0; i < 8; ++i)
-        p[i] = std::uint8_t(v >> (8 * i));
-}
-inline void putBe32(std::uint8_t *p, std::uint32_t v)
-{
-    for (int i = 0; i < 4; ++i)
-        p[i] = std::uint8_t(v >> (24 - 8 * i));
-}
-inline void putBe64(std::uint8_t *p, std::uint64_t v)
-{
-    putBe32(p, std::uint32_t(v >> 32));
-    putBe32(p + 4, std::uint32_t(v));
-}
+using ByteOrder::be32;
+using ByteOrder::be64;
+using ByteOrder::le16;
+using ByteOrder::le32;
+using ByteOrder::le64;
+using ByteOrder::putBe32;
+using ByteOrder::putBe64;
+using ByteOrder::putLe32;
+using ByteOrder::putLe64;
+
 inline bool isPowerOfTwo(std::uint64_t v)
 {
     return v != 0 && (v & (v - 1)) == 0;
