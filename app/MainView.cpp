@@ -1,6 +1,15 @@
 #include "MainView.h"
 
 #include "Commander.h"
+#include "DeviceChangeSink.h"
+
+#include "ClientFramework/DeviceChange/DeviceChangeHandler.h"
+#include "ClientFramework/NodeTree/NodeDevice.h"
+#include "ClientFramework/NodeTree/NodeRoot.h"
+#include "ClientFramework/Views/DiskExplorerView.h"
+#include "ClientFramework/Views/PropertyPane.h"
+#include "Kernel/Implementation/Platform/Linux/UdevMonitor.h"
+#include "Kernel/Implementation/Root.h"
 
 #include "ClientFramework/AppIdentity.h"
 #include "ClientFramework/CLI/Arguments.h"
@@ -14,6 +23,7 @@
 
 #include <QDir>
 #include <QFileInfo>
+#include <QMenu>
 #include <QStatusBar>
 
 namespace Solution {
@@ -32,6 +42,55 @@ MainView::MainView(Commander *commander, QWidget *parent) : Framework::MainView(
 {
     connect(this, &Framework::MainView::recentFileChosen, this,
             [this](const QString &path) { mountImage(path); });
+    NodeCore::setCommander(commander);
+    NodeCore::setFeatureHook([commander](const NodeCore &node, QMenu *menu) {
+        commander->addFeatureCommands(menu, {const_cast<NodeCore *>(&node)});
+    });
+    commander->setStateReader([](NodeCore *node) { return node ? node->state() : 0u; });
+}
+
+MainView::~MainView()
+{
+    // The views go before the tree they show.
+    m_monitor.reset();
+    m_deviceChange.reset();
+    commander()->setSelection({});
+    qDeleteAll(windowManager()->views());
+    if (NodeCore::commander() == commander())
+        NodeCore::setCommander(nullptr);
+}
+
+void MainView::setKernel(CRoot *kernel)
+{
+    m_kernel = kernel;
+    if (!kernel)
+        return;
+    m_nodes = std::make_unique<NodeRoot>(kernel);
+    connect(m_nodes.get(), &NodeRoot::notReadyTip, this, [this](const QString &tip) {
+        m_notReadyTip = tip;
+        if (auto *explorer = qobject_cast<Framework::DiskExplorerView *>(
+                windowManager()->view(Framework::DiskExplorerView::ViewId)))
+            explorer->showTip(tip);
+    });
+    m_sink = std::make_unique<DeviceChangeSink>(*kernel, *m_nodes);
+    m_deviceChange = std::make_unique<Framework::DeviceChange::Handler>(*m_sink);
+    m_monitor = CreateBlockDeviceMonitor();
+    if (m_monitor)
+        connect(m_monitor.get(), &IBlockDeviceMonitor::blockEvent, m_deviceChange.get(),
+                &Framework::DeviceChange::Handler::blockEvent);
+}
+
+void MainView::removeSelectedImages()
+{
+    if (!m_kernel)
+        return;
+    QList<CDevice *> images;
+    for (NodeCore *n : commander()->selection())
+        if (auto *d = dynamic_cast<NodeDevice *>(n); d && d->device() && (d->state() & NodeState::Image))
+            images << d->device();
+    commander()->setSelection({});
+    for (CDevice *device : std::as_const(images))
+        m_kernel->RemoveDevice(device);
 }
 
 void MainView::registerViews()
@@ -40,10 +99,33 @@ void MainView::registerViews()
     windowManager()->registerView(Framework::WelcomeView::ViewId, [this] {
         return new Framework::WelcomeView(commander(), GettingStarted, Support);
     });
+    if (!m_nodes)
+        return;
+    windowManager()->registerView(Framework::DiskExplorerView::ViewId, [this] {
+        auto *view = new Framework::DiskExplorerView(m_nodes.get(), commander());
+        view->showTip(m_notReadyTip);
+        connect(view, &Framework::DiskExplorerView::populationStarted, this,
+                [this](const QString &text) { showProgress(text); });
+        connect(view, &Framework::DiskExplorerView::populationFinished, this, [this] { clearProgress(); });
+        return view;
+    });
+    windowManager()->registerView(
+        Framework::PropertyPane::ViewId,
+        [this] {
+            auto *pane = new Framework::PropertyPane;
+            pane->showNodes(commander()->selection());
+            connect(windowManager(), &Framework::WindowManager::selectionChanged, pane,
+                    [pane](INodeSource *, const QList<NodeCore *> &nodes) { pane->showNodes(nodes); });
+            return pane;
+        },
+        Framework::WindowManager::Placement::DockRight);
 }
 
 QStringList MainView::defaultViews() const
 {
+    if (m_nodes)
+        return {Framework::DiskExplorerView::ViewId, Framework::PropertyPane::ViewId,
+                Framework::LogView::ViewId};
     return {Framework::LogView::ViewId};
 }
 
@@ -64,9 +146,23 @@ bool MainView::welcomeAtStart() const
     return Framework::WelcomeView::showOnStartup(views);
 }
 
+void MainView::load(const QDomElement &element)
+{
+    Framework::MainView::load(element);
+    // The Disk Explorer is always there at start (behind the welcome view when that shows).
+    if (m_nodes && !windowManager()->view(Framework::DiskExplorerView::ViewId)) {
+        Framework::GenericView *current = windowManager()->activeView();
+        windowManager()->openView(Framework::DiskExplorerView::ViewId);
+        if (current)
+            windowManager()->setCurrentWidget(current);
+    }
+}
+
 QString MainView::initialView() const
 {
-    return welcomeAtStart() ? Framework::WelcomeView::ViewId : QString();
+    if (welcomeAtStart())
+        return Framework::WelcomeView::ViewId;
+    return m_nodes ? Framework::DiskExplorerView::ViewId : QString();
 }
 
 bool MainView::mountImage(const QString &path)
@@ -127,6 +223,12 @@ void MainView::connectCommands()
                   [this] { windowManager()->openView(QStringLiteral("explorer")); });
     c->setHandler(QStringLiteral("cmdOpen_Browser"),
                   [this] { windowManager()->openView(QStringLiteral("browser")); });
+    c->setHandler(QStringLiteral("cmdProperties"),
+                  [this] { windowManager()->openView(Framework::PropertyPane::ViewId); });
+    if (m_kernel) {
+        c->setHandler(QStringLiteral("cmdRefresh"), [this] { m_kernel->Refresh(); });
+        c->setHandler(QStringLiteral("cmdRemove"), [this] { removeSelectedImages(); });
+    }
     c->setHandler(QStringLiteral("cmdWebHome"), [] { UserPrompts::current().openUrl(HomePage); });
     c->setHandler(QStringLiteral("cmdWebRequest"), [] { UserPrompts::current().openUrl(RequestPage); });
     c->setHandler(QStringLiteral("cmdWebHelp"), [] { UserPrompts::current().openUrl(HelpPage); });

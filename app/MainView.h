@@ -5,10 +5,20 @@
 #include "ClientFramework/Views/MainView.h"
 
 #include <functional>
+#include <memory>
+
+class CRoot;
+class IBlockDeviceMonitor;
+class NodeRoot;
+
+namespace Framework::DeviceChange {
+class Handler;
+}
 
 namespace Solution {
 
 class Commander;
+class DeviceChangeSink;
 
 class MainView : public Framework::MainView
 {
@@ -31,6 +41,15 @@ public:
                                                QStringLiteral("cmdSettings")};
 
     explicit MainView(Commander *commander, QWidget *parent = nullptr);
+    ~MainView() override;
+
+    // The kernel root the window shows (not owned; set before build()): the node tree over it,
+    // the device-change handler and the platform's block-device monitor.
+    void setKernel(CRoot *kernel);
+    CRoot *kernel() const { return m_kernel; }
+    NodeRoot *nodeRoot() const { return m_nodes.get(); }
+    Framework::DeviceChange::Handler *deviceChange() const { return m_deviceChange.get(); }
+    IBlockDeviceMonitor *blockMonitor() const { return m_monitor.get(); }
 
     void setHooks(Hooks hooks) { m_hooks = std::move(hooks); }
 
@@ -39,6 +58,7 @@ public:
     bool mountImage(const QString &path);
 
 protected:
+    void load(const QDomElement &element) override;
     void registerViews() override;
     void connectCommands() override;
     QStringList defaultViews() const override;
@@ -47,8 +67,15 @@ protected:
 
 private:
     bool welcomeAtStart() const;
+    void removeSelectedImages();
 
     Hooks m_hooks;
+    CRoot *m_kernel = nullptr;
+    std::unique_ptr<NodeRoot> m_nodes;
+    std::unique_ptr<DeviceChangeSink> m_sink;
+    std::unique_ptr<Framework::DeviceChange::Handler> m_deviceChange;
+    std::unique_ptr<IBlockDeviceMonitor> m_monitor;
+    QString m_notReadyTip;
 };
 
 } // namespace Solution

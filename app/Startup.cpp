@@ -2,9 +2,9 @@
 
 #include "CliArguments.h"
 #include "Commander.h"
+#include "KernelHost.h"
 #include "MainView.h"
 #include "ProcessingAction.h"
-#include "KernelHost.h"
 #include "RequestHost.h"
 
 #include "ClientFramework/AppIdentity.h"
@@ -128,6 +128,7 @@ int Startup::run(const QStringList &argumentList, int &argc, char **argv)
 
         commander = std::make_unique<Solution::Commander>();
         mainView = std::make_unique<MainView>(commander.get());
+        mainView->setKernel(root.get());
 
         host = std::make_unique<CLI::KernelHost>(*root);
         if (arguments->isOptionSet(QStringLiteral("mountdi")))
@@ -145,6 +146,8 @@ int Startup::run(const QStringList &argumentList, int &argc, char **argv)
         application->registerComponent(Framework::RecentFiles::SettingsElement, mainView->recentFiles());
         application->registerComponent(Framework::MainView::SettingsElement, mainView.get());
         mainView->show();
+        // This machine's disks join the tree as the enumeration finds them.
+        root->Refresh();
         application->initializationCompleted();
 
         log.add(

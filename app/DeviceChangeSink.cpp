@@ -1,0 +1,90 @@
+#include "DeviceChangeSink.h"
+
+#include "ClientFramework/NodeTree/NodeComputer.h"
+#include "ClientFramework/NodeTree/NodeDevice.h"
+#include "ClientFramework/NodeTree/NodeRoot.h"
+#include "Kernel/Implementation/Device.h"
+#include "Kernel/Implementation/Platform/PlatformFile.h"
+#include "Kernel/Implementation/Root.h"
+
+namespace Solution {
+
+namespace {
+
+QString platformPath(const CDevice *device)
+{
+    CPlatformFile *handle = device ? device->GetHandle() : nullptr;
+    return handle ? handle->GetName() : QString();
+}
+
+} // namespace
+
+NodeCore *DeviceChangeSink::nodeForPath(const QString &devicePath)
+{
+    if (devicePath.isEmpty())
+        return nullptr;
+    // By pointer identity only: the kernel's list and the node list are read on this thread.
+    for (NodeDevice *d : m_nodes.deviceNodes())
+        if (d->device() && platformPath(d->device()) == devicePath)
+            return d;
+    return nullptr;
+}
+
+bool DeviceChangeSink::isAlive(NodeCore *node)
+{
+    if (node == m_nodes.computer())
+        return true;
+    for (NodeDevice *d : m_nodes.deviceNodes())
+        if (d == node)
+            return true;
+    return false;
+}
+
+QString DeviceChangeSink::nodeName(NodeCore *node)
+{
+    return node ? node->text(NodeAttr::Name) : QString();
+}
+
+bool DeviceChangeSink::isBusy(NodeCore *node)
+{
+    return node && (node->state() & (NodeState::Busy | NodeState::Waiting));
+}
+
+bool DeviceChangeSink::isUnderProcessing(NodeCore *node)
+{
+    return node && (node->state() & NodeState::Busy);
+}
+
+bool DeviceChangeSink::isValidating()
+{
+    return m_kernel.IsEnumerating();
+}
+
+void DeviceChangeSink::repopulate(NodeCore *node)
+{
+    if (node == m_nodes.computer()) {
+        m_kernel.Refresh();
+        return;
+    }
+    auto *d = dynamic_cast<NodeDevice *>(node);
+    if (!d || !d->device())
+        return;
+    CDevice *device = d->device();
+    if (device->GetDescriptor().sub != 0) {
+        d->refreshState();
+        d->rebuild();
+        return;
+    }
+    const QString path = platformPath(device);
+    m_kernel.RemoveDevice(device);
+    if (!path.isEmpty())
+        m_kernel.RequestAdd(path);
+}
+
+void DeviceChangeSink::addDevice(const QString &devicePath)
+{
+    if (!m_kernel.FindDeviceByPath(devicePath))
+        m_kernel.RequestAdd(devicePath);
+}
+
+} // namespace Solution
