@@ -71,15 +71,17 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t *data, size_t size)
 {
     if (size < 4)
         return 0;
-    // Byte 0: sector size; byte 1: the claimed source size in 4 KiB units above the data; bytes 2-3:
-    // the record offset. The rest is the source's first bytes.
+    // Byte 0: sector size (low bits) and kind (high bits); byte 1: the claimed source size in 4 KiB
+    // units above the data; bytes 2-3: the record offset. The rest is the source's first bytes.
     static const std::uint32_t sectorSizes[] = {512, 1024, 2048, 4096, 8192, 65536, 520, 0};
     const std::uint32_t bps = sectorSizes[data[0] & 7];
     const QByteArray bytes(reinterpret_cast<const char *>(data + 4), qsizetype(size - 4));
     const std::uint64_t claimed = std::uint64_t(bytes.size()) + std::uint64_t(data[1]) * 4096;
     const std::uint64_t offset = std::uint64_t(data[2]) << 8 | data[3];
     MemorySource source(bytes, claimed, bps);
-    for (T::Type type : T::availableTypes()) {
+    const QList<T::Type> types = T::availableTypes();
+    {
+        const T::Type type = types[(data[0] >> 3) % types.size()];
         T::Record record(&source, T::createBuilder(type), QLocale::c());
         record.setOffset(offset / 2, false);
         record.setOffset(offset, true);

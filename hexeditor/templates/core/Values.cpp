@@ -5,6 +5,7 @@
 #include <QStringDecoder>
 #include <QStringEncoder>
 
+#include <cctype>
 #include <limits>
 
 namespace HexEditor::Templates::Values {
@@ -193,11 +194,17 @@ QByteArray toLocal8(const QString &text)
 
 QString hexPairs(const QByteArray &bytes, const QString &separator)
 {
-    QStringList parts;
-    parts.reserve(bytes.size());
-    for (char c : bytes)
-        parts.append(QStringLiteral("%1").arg(std::uint8_t(c), 2, 16, QLatin1Char('0')).toUpper());
-    return parts.join(separator);
+    static const char digits[] = "0123456789ABCDEF";
+    QString out;
+    out.reserve(bytes.size() * (2 + separator.size()));
+    for (qsizetype i = 0; i < bytes.size(); ++i) {
+        if (i)
+            out += separator;
+        const auto v = std::uint8_t(bytes[i]);
+        out += QLatin1Char(digits[v >> 4]);
+        out += QLatin1Char(digits[v & 15]);
+    }
+    return out;
 }
 
 QString display(FieldFormat format, const QByteArray &b, std::uint32_t offset, std::uint32_t size,
@@ -437,9 +444,9 @@ std::optional<QByteArray> parse(FieldFormat format, const QString &text, std::ui
         t.remove(QLatin1Char(' '));
         if (t.size() != qsizetype(size) * 2)
             return std::nullopt;
-        static const QRegularExpression hex(QStringLiteral("^[0-9A-Fa-f]*$"));
-        if (!hex.match(t).hasMatch())
-            return std::nullopt;
+        for (QChar ch : t)
+            if (!isxdigit(ch.unicode() < 128 ? int(ch.unicode()) : 'x'))
+                return std::nullopt;
         return QByteArray::fromHex(t.toLatin1());
     }
     case DosDate: {
