@@ -67,8 +67,11 @@ void NodeDevice::refreshState()
     std::uint32_t s = state() & (NodeState::Busy | NodeState::Waiting | NodeState::Populated);
     if (m_device) {
         const std::uint32_t a = m_device->GetAttributes();
-        if (m_device->IsReady() && !(a & DeviceAttribute::NotReady))
+        if (m_device->IsReady() && !(a & DeviceAttribute::NotReady)) {
             s |= NodeState::Ready;
+            if (!m_device->IsWritable())
+                s |= NodeState::ReadOnly;
+        }
         if (isImage(m_device))
             s |= NodeState::Image;
         if (isRaid(m_device))
