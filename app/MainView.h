@@ -57,8 +57,9 @@ public:
     // it opens.
     bool mountImage(const QString &path);
 
-protected:
     void load(const QDomElement &element) override;
+
+protected:
     void registerViews() override;
     void connectCommands() override;
     QStringList defaultViews() const override;

@@ -131,8 +131,10 @@ int Startup::run(const QStringList &argumentList, int &argc, char **argv)
         mainView->setKernel(root.get());
 
         host = std::make_unique<CLI::KernelHost>(*root);
+        // "-mountdi" may be given more than once: every image opens as a virtual disk.
         if (arguments->isOptionSet(QStringLiteral("mountdi")))
-            host->mountImage(arguments->parser.value(QStringLiteral("mountdi")));
+            for (const QString &image : arguments->parser.values(QStringLiteral("mountdi")))
+                host->mountImage(image);
         auto *action = new CLI::ProcessingAction(*host, application.get());
         action->runAfterInitialization(application.get());
         QObject::connect(action, &CLI::ProcessingAction::quitRequested, application.get(),
