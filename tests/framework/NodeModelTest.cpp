@@ -98,6 +98,13 @@ TEST(NodeModels, FollowDevicesArrivingAndLeaving)
         EXPECT_NE(proxy.index(r, 1, proxy.mapFromSource(devIndex)).data().toString(), "Unallocated");
     proxy.setFilters(NodeSortFilterModel::All);
 
+    // A device identified again is rebuilt under the live models, with the same keys.
+    const int before = countRows(model);
+    const QString firstKey = tree.deviceNode(m)->child(0)->text(NodeAttr::Key);
+    tree.onKernelStorage(_event_storage{m, _event_storage::ChangeCompleted, 0});
+    EXPECT_EQ(countRows(model), before);
+    EXPECT_EQ(tree.deviceNode(m)->child(0)->text(NodeAttr::Key), firstKey);
+
     // A device leaves while all three models are live.
     QPersistentModelIndex keep(model.indexOf(tree.deviceNode(g)));
     ASSERT_TRUE(root.RemoveDevice(m));
