@@ -231,8 +231,12 @@ void DeviceMap::paintEvent(QPaintEvent *)
         painter.setPen(s.node == m_selected ? QPen(palette().color(QPalette::Highlight), 2) : QPen(frame));
         painter.drawRect(s.rect.adjusted(0, 0, -1, -1));
         painter.setPen(QColor(0x20, 0x20, 0x20));
-        if (s.rect.width() > 24)
-            painter.drawText(s.rect.adjusted(3, 2, -3, -2), Qt::AlignCenter | Qt::TextWordWrap, s.label);
+        // A label that does not fit stays in the tool tip of the tree; a narrow piece shows none.
+        const QRect inner = s.rect.adjusted(3, 2, -3, -2);
+        const QRect needed = painter.fontMetrics().boundingRect(QRect(0, 0, inner.width(), 1000),
+                                                                Qt::AlignCenter | Qt::TextWordWrap, s.label);
+        if (needed.width() <= inner.width() && needed.height() <= inner.height())
+            painter.drawText(inner, Qt::AlignCenter | Qt::TextWordWrap, s.label);
     }
     if (m_segments.isEmpty()) {
         painter.setPen(palette().color(QPalette::PlaceholderText));

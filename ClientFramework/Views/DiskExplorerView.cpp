@@ -54,6 +54,7 @@ DiskExplorerView::DiskExplorerView(NodeCore *root, Core::Commander *commander, Q
     splitter->addWidget(mapScroll);
     splitter->setStretchFactor(0, 3);
     splitter->setStretchFactor(1, 2);
+    splitter->setSizes({360, 200});
     auto *page = new QWidget;
     auto *layout = new QVBoxLayout(page);
     layout->setContentsMargins(0, 0, 0, 0);

@@ -56,7 +56,14 @@ MainView::MainView(Core::Commander *commander, QWidget *parent)
     resize(1024, 720);
 }
 
-MainView::~MainView() = default;
+MainView::~MainView()
+{
+    // The window manager and the docks go after this object's members: they must not call back.
+    disconnect(m_windows, nullptr, this, nullptr);
+    for (QDockWidget *d : findChildren<QDockWidget *>())
+        disconnect(d, nullptr, this, nullptr);
+    m_stateTimer->stop();
+}
 
 QMenu *MainView::menu(const QString &title) const
 {

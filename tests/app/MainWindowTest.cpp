@@ -63,6 +63,28 @@ QString makeMbrImage(const QString &dir)
     return disk;
 }
 
+// A GPT disk of 64 MiB: a FAT data partition and an ext4 partition.
+QString makeGptImage(const QString &dir)
+{
+    const QString disk = dir + "/gpt.img";
+    const QString fat = dir + "/gfat.part";
+    const QString ext = dir + "/gext.part";
+    if (TestUtil::run("truncate", {"-s", "64M", disk}).exitCode != 0 ||
+        TestUtil::run("sgdisk", {"-n", "1:2048:+16M", "-t", "1:0700", "-c", "1:data", "-n", "2:0:+24M", "-t",
+                                 "2:8300", "-c", "2:linux", disk})
+                .exitCode != 0)
+        return {};
+    if (TestUtil::run("mkfs.vfat", {"-C", fat, "16384"}).exitCode != 0 ||
+        TestUtil::run("mkfs.ext4", {"-q", "-F", ext, "24M"}).exitCode != 0)
+        return {};
+    if (TestUtil::run("dd", {"if=" + fat, "of=" + disk, "bs=512", "seek=2048", "conv=notrunc"}).exitCode !=
+            0 ||
+        TestUtil::run("dd", {"if=" + ext, "of=" + disk, "bs=512", "seek=34816", "conv=notrunc"}).exitCode !=
+            0)
+        return {};
+    return disk;
+}
+
 bool haveImageTools()
 {
     for (const char *tool : {"truncate", "sfdisk", "mkfs.vfat", "mkfs.ext4", "dd"})
@@ -276,4 +298,41 @@ TEST(MainWindow, TenMountedImagesArePopulatedQuickly)
     std::cout << "[ figure ] window with ten mounted images populated in " << ms << " ms" << std::endl;
     EXPECT_EQ(Framework::DeviceMap::devices(w.view.nodeRoot()).size(), 10);
     EXPECT_LT(ms, 10000);
+}
+
+// Pictures of the Disk Explorer and the property pane with an MBR and a GPT image mounted, written
+// when BRINDLE_SCREENSHOT_DIR names a folder (run under a real display to look at them).
+TEST(MainWindow, Screenshots)
+{
+    const QString out = qEnvironmentVariable("BRINDLE_SCREENSHOT_DIR");
+    if (out.isEmpty())
+        GTEST_SKIP() << "set BRINDLE_SCREENSHOT_DIR to write the pictures";
+    if (!haveImageTools() || !TestUtil::haveTool("sgdisk"))
+        GTEST_SKIP() << "needs the image tools and sgdisk";
+    QTemporaryDir dir;
+    const QString mbr = makeMbrImage(dir.path());
+    const QString gpt = makeGptImage(dir.path());
+    ASSERT_FALSE(mbr.isEmpty());
+    ASSERT_FALSE(gpt.isEmpty());
+    Window w;
+    ASSERT_TRUE(w.view.mountImage(mbr));
+    ASSERT_TRUE(w.view.mountImage(gpt));
+    w.view.windowManager()->openView("explorer");
+    w.view.resize(1280, 820);
+    w.view.show();
+    QTest::qWait(300);
+    auto *explorer = w.explorer();
+    NodeCore *target = nullptr;
+    for (const QModelIndex &i : walk(explorer->tree()->model())) {
+        NodeCore *n = explorer->model()->nodeOf(explorer->filterModel()->mapToSource(i));
+        if (n && n->kind() == NodeKind::Partition && n->text(NodeAttr::Kind) != "Unallocated") {
+            target = n;
+            break;
+        }
+    }
+    ASSERT_NE(target, nullptr);
+    explorer->selectNode(target);
+    QTest::qWait(300);
+    EXPECT_TRUE(w.view.grab().save(out + "/explorer.png"));
+    EXPECT_TRUE(w.view.windowManager()->view("properties")->grab().save(out + "/properties.png"));
 }
