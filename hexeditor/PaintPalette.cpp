@@ -2,6 +2,8 @@
 
 #include <QRegularExpression>
 
+#include "ClientFramework/Themes/Theme.h"
+
 namespace HexEditor {
 
 namespace {
@@ -141,9 +143,52 @@ PaintPalette PaintPalette::fromElement(const QDomElement &hexView, const PaintPa
     return p;
 }
 
+PaintPalette PaintPalette::fromTheme(const Framework::Theme &theme)
+{
+    const PaintPalette base = theme.name() == QLatin1String("dark") ? darkTheme() : defaultTheme();
+    const QString palette = QStringLiteral("hex-view");
+    if (!theme.hasPalette(palette))
+        return base;
+    PaintPalette p = base;
+    auto get = [&](const char *entry, QColor &target) {
+        const QStringList entries = theme.paletteEntries(palette);
+        if (entries.contains(QLatin1String(entry)))
+            target = theme.color(palette, QLatin1String(entry), target);
+    };
+    get("text-default", p.text);
+    get("text-header", p.header);
+    get("text-disabled", p.disabled);
+    get("text-modified", p.modified);
+    get("text-link", p.link);
+    get("elements-lines", p.lines);
+    get("elements-grid", p.grid);
+    get("elements-watermark", p.watermark);
+    get("elements-background", p.background);
+    get("elements-background-selected", p.selected);
+    get("cursor-foreground", p.cursor.foreground);
+    get("cursor-background", p.cursor.background);
+    get("cursor-inactive", p.cursorInactive);
+    get("bookmark-from", p.bookmarkFrom);
+    get("bookmark-to", p.bookmarkTo);
+    get("bookmark-border", p.bookmarkBorder);
+    get("bookmark-corner", p.bookmarkCorner);
+    get("searched-foreground", p.searched.foreground);
+    get("searched-background", p.searched.background);
+    get("ghosted-foreground", p.ghosted.foreground);
+    get("ghosted-background", p.ghosted.background);
+    get("template-palette-item", p.templateItem);
+    for (int i = 0; i < p.templateItems.size(); ++i) {
+        const QByteArray fg = QStringLiteral("template-palette-item%1-foreground").arg(i + 1).toLatin1();
+        const QByteArray bg = QStringLiteral("template-palette-item%1-background").arg(i + 1).toLatin1();
+        get(fg.constData(), p.templateItems[i].foreground);
+        get(bg.constData(), p.templateItems[i].background);
+    }
+    return p;
+}
+
 PaintPalette PaintPalette::current()
 {
-    return defaultTheme();
+    return fromTheme(Framework::Theme::active());
 }
 
 QColor PaintPalette::grey(const QColor &color)

@@ -7,6 +7,10 @@
 #include <QList>
 #include <QString>
 
+namespace Framework {
+class Theme;
+}
+
 namespace HexEditor {
 
 struct PaintPalette
@@ -41,6 +45,9 @@ struct PaintPalette
     // Reads the "hex-view" element of a theme palette; entries it lacks keep the values of `base`.
     static PaintPalette fromElement(const QDomElement &hexView, const PaintPalette &base = defaultTheme());
 
+    // The "hex-view" palette of a theme document (entries "text-default", "cursor-background",
+    // "template-palette-item1-foreground" and so on); entries it lacks keep the built-in values.
+    static PaintPalette fromTheme(const Framework::Theme &theme);
     // The palette of the active application theme (the default theme when none is loaded).
     static PaintPalette current();
 
