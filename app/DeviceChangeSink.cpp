@@ -23,7 +23,9 @@ NodeCore *DeviceChangeSink::nodeForPath(const QString &devicePath)
 {
     if (devicePath.isEmpty())
         return nullptr;
-    // By pointer identity only: the kernel's list and the node list are read on this thread.
+    if (CDevice *device = m_kernel.FindDeviceByPath(devicePath))
+        if (NodeDevice *node = m_nodes.deviceNode(device))
+            return node;
     for (NodeDevice *d : m_nodes.deviceNodes())
         if (d->device() && platformPath(d->device()) == devicePath)
             return d;

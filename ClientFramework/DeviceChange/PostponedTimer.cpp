@@ -19,6 +19,7 @@ void QtPostponedTimer::start(int intervalMs)
 {
     m_timer->stop();
     m_timer->start(intervalMs);
+    m_id = m_timer->timerId();
 }
 
 void QtPostponedTimer::stop()
@@ -33,7 +34,7 @@ bool QtPostponedTimer::isActive() const
 
 int QtPostponedTimer::id() const
 {
-    return m_timer->timerId();
+    return m_id;
 }
 
 } // namespace Framework::DeviceChange

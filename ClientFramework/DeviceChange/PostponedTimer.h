@@ -37,6 +37,7 @@ public:
 
 private:
     std::unique_ptr<QTimer> m_timer;
+    int m_id = 0; // the id of the last start (the timer has none once it fired)
 };
 
 } // namespace Framework::DeviceChange

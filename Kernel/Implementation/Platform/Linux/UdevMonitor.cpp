@@ -1,7 +1,10 @@
 #include "UdevMonitor.h"
 
+#include <QDir>
+#include <QFile>
 #include <QFileInfo>
 #include <QSocketNotifier>
+#include <QTimer>
 
 #include <libudev.h>
 
@@ -42,6 +45,35 @@ UdevMonitor::UdevMonitor(QObject *parent) : IBlockDeviceMonitor(parent)
         return;
     m_notifier = new QSocketNotifier(udev_monitor_get_fd(m_monitor), QSocketNotifier::Read, this);
     connect(m_notifier, &QSocketNotifier::activated, this, &UdevMonitor::receive);
+    pollLoopDevices(); // the flags as they are now: only a later change counts
+    m_loopPoll = new QTimer(this);
+    connect(m_loopPoll, &QTimer::timeout, this, &UdevMonitor::pollLoopDevices);
+    m_loopPoll->start(LoopPollMs);
+}
+
+void UdevMonitor::pollLoopDevices()
+{
+    const QStringList names =
+        QDir(QStringLiteral("/sys/block"))
+            .entryList({QStringLiteral("loop*")}, QDir::Dirs | QDir::NoDotAndDotDot | QDir::System);
+    QHash<QString, bool> now;
+    for (const QString &name : names) {
+        QFile flag(QStringLiteral("/sys/block/%1/loop/autoclear").arg(name));
+        if (!flag.open(QIODevice::ReadOnly))
+            continue; // not attached
+        now.insert(QStringLiteral("/dev/") + name, flag.readAll().trimmed() == "1");
+    }
+    const bool first = m_autoClear.isEmpty() && !m_loopPoll;
+    for (auto it = now.cbegin(); it != now.cend(); ++it) {
+        if (first || !it.value() || m_autoClear.value(it.key(), true))
+            continue;
+        BlockDeviceEvent e;
+        e.action = BlockDeviceEvent::Action::Change;
+        e.devicePath = e.diskPath = it.key();
+        e.mediumPresent = false;
+        emit blockEvent(e);
+    }
+    m_autoClear = now;
 }
 
 UdevMonitor::~UdevMonitor()

@@ -4,6 +4,7 @@
 // monitor through its event loop. The interface keeps libudev out of every other file.
 #pragma once
 
+#include <QHash>
 #include <QMetaType>
 #include <QObject>
 #include <QString>
@@ -53,6 +54,12 @@ public:
     // "udev" or "kernel": the source read.
     QString source() const { return m_source; }
 
+    // Loop devices detached while this process holds them open stay attached until the last close;
+    // the kernel announces nothing then. A poll of their auto-clear flag reports them as a medium
+    // that left.
+    static constexpr int LoopPollMs = 2000;
+    void pollLoopDevices();
+
 private:
     void receive();
 
@@ -60,4 +67,6 @@ private:
     struct udev_monitor *m_monitor = nullptr;
     class QSocketNotifier *m_notifier = nullptr;
     QString m_source;
+    class QTimer *m_loopPoll = nullptr;
+    QHash<QString, bool> m_autoClear; // loop device path -> auto-clear flag last seen
 };
