@@ -7,6 +7,7 @@
 #include "Read.h"
 #include "Template.h"
 #include "Version.h"
+#include "Write.h"
 #include "Volumes.h"
 
 namespace Cli {
@@ -36,6 +37,7 @@ const QList<Command> &commands()
         {"volumes", "SOURCE [--json]", "Lists the volume of every partition: file system, geometry, label and integrity.", &runVolumes},
         {"hwinfo", "FILE", "Writes the hardware-information report of this machine as XML.", &runHwInfo},
         {"read", "SOURCE --offset N --length N [--raw]", "Prints bytes of a device as a hex dump, or raw.", &runRead},
+        {"write", "SOURCE --offset N (--hex HEX | --file PATH) --yes", "Writes bytes to a device or image, whole sectors through the kernel.", &runWrite},
         {"image", "info FILE [--json] | create SOURCE OUTPUT [--level N] [--sectors-per-block N] [--description TEXT] | verify FILE", "Shows, creates (own format) or verifies a disk image.", &runImage},
         {"template", "SOURCE --type ID|NAME --offset N [--copy-offset N] [--json] | SOURCE --auto [--json]", "Prints the field tree of a structure template placed at an offset.", &runTemplate},
     };

@@ -135,8 +135,14 @@ inline void WriteGuard::lockRange(cStorage *object, std::uint64_t first, std::ui
                 candidates.push_back({v.path, v.mountPoint, e.offset, e.length});
         }
     }
-    for (std::uint32_t i = 0; i < device->GetPartitionCount(); ++i)
+    bool partitioned = false;
+    for (std::uint32_t i = 0; i < device->GetPartitionCount(); ++i) {
+        partitioned = partitioned || device->GetPartition(i)->GetKind() != 0;
         WriteGuardDetail::collectPartitions(device->GetPartition(i), ss, candidates);
+    }
+    // A file system over the whole device (no table) is held by the device itself.
+    if (!partitioned && device->GetHandle() && device->GetHandle()->GetKind() == PlatformKind::Device)
+        candidates.push_back({device->GetHandle()->GetName(), QString(), 0, device->GetSize()});
 
     const std::uint64_t from = first * ss, to = (first + count) * ss;
     QStringList locked;

@@ -1,0 +1,157 @@
+#include "Write.h"
+
+#include <QFile>
+
+#include <cctype>
+
+#include "Kernel/Implementation/Device.h"
+#include "Kernel/Implementation/Root.h"
+#include "Source.h"
+#include "hexeditor/StorageSectorWrite.h"
+#include "hexeditor/StorageWriteGuard.h"
+
+namespace Cli {
+
+namespace {
+
+// The most a single write command takes (the editor's own limit for one edit is far lower).
+constexpr qint64 MaxInput = qint64(1) << 30;
+
+bool parseNumber(const QString &text, std::uint64_t &value)
+{
+    bool ok = false;
+    if (text.startsWith(QLatin1String("0x"), Qt::CaseInsensitive))
+        value = text.mid(2).toULongLong(&ok, 16);
+    else
+        value = text.toULongLong(&ok, 10);
+    return ok;
+}
+
+// Hexadecimal digit pairs; blanks, colons and dashes between pairs are allowed.
+bool parseHex(const QString &text, QByteArray &bytes)
+{
+    QString digits;
+    for (const QChar c : text) {
+        if (c == QLatin1Char(' ') || c == QLatin1Char(':') || c == QLatin1Char('-'))
+            continue;
+        if (!isxdigit(c.toLatin1()) || c.unicode() > 0x7F)
+            return false;
+        digits += c;
+    }
+    if (digits.isEmpty() || digits.size() % 2)
+        return false;
+    bytes = QByteArray::fromHex(digits.toLatin1());
+    return true;
+}
+
+int usage(Io &io, const QString &problem)
+{
+    io.err << "brindle-cli write: " << problem << "\n"
+           << "usage: brindle-cli write SOURCE --offset N (--hex HEX | --file PATH) --yes\n";
+    return Usage;
+}
+
+} // namespace
+
+int runWrite(const QStringList &args, Io &io)
+{
+    QString source, hex, file;
+    std::uint64_t offset = 0;
+    bool haveOffset = false, haveHex = false, haveFile = false, yes = false;
+    for (int i = 0; i < args.size(); ++i) {
+        const QString &a = args[i];
+        if (a == QLatin1String("--yes")) {
+            yes = true;
+        } else if (a == QLatin1String("--offset") || a == QLatin1String("--hex") ||
+                   a == QLatin1String("--file")) {
+            if (i + 1 >= args.size())
+                return usage(io, QStringLiteral("%1 needs a value").arg(a));
+            const QString &v = args[++i];
+            if (a == QLatin1String("--offset")) {
+                if (!parseNumber(v, offset))
+                    return usage(io, QStringLiteral("'%1' is not a byte offset").arg(v));
+                haveOffset = true;
+            } else if (a == QLatin1String("--hex")) {
+                hex = v;
+                haveHex = true;
+            } else {
+                file = v;
+                haveFile = true;
+            }
+        } else if (a.startsWith(QLatin1String("--"))) {
+            return usage(io, QStringLiteral("unknown option '%1'").arg(a));
+        } else if (source.isEmpty()) {
+            source = a;
+        } else {
+            return usage(io, QStringLiteral("more than one source given"));
+        }
+    }
+    if (source.isEmpty())
+        return usage(io, QStringLiteral("no source given"));
+    if (!haveOffset)
+        return usage(io, QStringLiteral("--offset is required"));
+    if (haveHex == haveFile)
+        return usage(io, QStringLiteral("give exactly one of --hex and --file"));
+
+    QByteArray bytes;
+    if (haveHex && !parseHex(hex, bytes))
+        return usage(io, QStringLiteral("'%1' is not a sequence of hexadecimal byte pairs").arg(hex));
+    if (haveFile) {
+        QFile in(file);
+        if (!in.open(QIODevice::ReadOnly)) {
+            io.err << "brindle-cli write: cannot read '" << file << "': " << in.errorString() << "\n";
+            return Failed;
+        }
+        if (in.size() > MaxInput) {
+            io.err << "brindle-cli write: '" << file << "' is larger than " << MaxInput << " bytes\n";
+            return Failed;
+        }
+        bytes = in.readAll();
+        if (bytes.isEmpty()) {
+            io.err << "brindle-cli write: '" << file << "' is empty\n";
+            return Failed;
+        }
+    }
+    if (!yes) {
+        io.err << "brindle-cli write: refusing to write " << bytes.size() << " bytes to " << source
+               << " without --yes (this changes the medium and can damage its file systems)\n";
+        return Failed;
+    }
+
+    CRoot root;
+    QString error;
+    CDevice *device = resolveSource(root, source, error);
+    if (!device) {
+        io.err << "brindle-cli write: " << error << "\n";
+        return Failed;
+    }
+    const std::uint64_t size = device->GetSize();
+    const std::uint64_t ss = device->GetBytesPerSector();
+    if (!ss || offset >= size || std::uint64_t(bytes.size()) > size - offset) {
+        io.err << "brindle-cli write: " << bytes.size() << " bytes at offset " << offset << " do not fit "
+               << device->GetDisplayName() << " (" << size << " bytes)\n";
+        return Failed;
+    }
+    const std::uint64_t first = offset / ss;
+    const std::uint64_t last = (offset + std::uint64_t(bytes.size()) - 1) / ss;
+    HexEditor::WriteGuard guard(device, first, last - first + 1);
+    if (!guard.refusal().isEmpty()) {
+        io.err << "brindle-cli write: " << guard.refusal() << "\n";
+        return Failed;
+    }
+    const HexEditor::SectorWrite::Result r =
+        HexEditor::SectorWrite::writeBytes(*device, offset, bytes.constData(), std::uint64_t(bytes.size()));
+    device->Flush();
+    if (!r.ok()) {
+        io.err << "brindle-cli write: " << device->GetDisplayName() << ": "
+               << (r.readFailed ? "reading" : "writing") << " sector " << r.failedSector
+               << " failed (system error " << r.error << "); " << r.written << " of " << bytes.size()
+               << " bytes written\n";
+        return Failed;
+    }
+    io.out << "wrote " << bytes.size() << " bytes at offset " << offset << " to " << device->GetDisplayName()
+           << " (" << (last - first + 1) << " sectors)\n";
+    return Ok;
+}
+
+} // namespace Cli

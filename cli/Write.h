@@ -1,0 +1,13 @@
+// brindle-cli write: bytes written to a device or image through the kernel, whole sectors only
+// (partial sectors are read, patched and written back), after an explicit --yes.
+#pragma once
+
+#include <QStringList>
+
+#include "CliCommand.h"
+
+namespace Cli {
+
+int runWrite(const QStringList &args, Io &io);
+
+} // namespace Cli
