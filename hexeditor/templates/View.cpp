@@ -21,6 +21,12 @@
 #include "hexeditor/EditorCtrl.h"
 #include "hexeditor/Storage.h"
 
+// The pane's own icons live in a static library: register them before first use.
+static void initTemplateResources()
+{
+    Q_INIT_RESOURCE(templates);
+}
+
 namespace HexEditor::Templates {
 
 namespace {
@@ -43,6 +49,7 @@ std::uint32_t partitionStyle(Storage *storage)
 
 View::View(EditorCtrl *editor, Storage *storage, QWidget *parent) : QWidget(parent), m_editor(editor)
 {
+    initTemplateResources();
     setObjectName(ViewId);
     setWindowTitle(tr("Templates"));
     m_selector = new SelectorCtrl(this);
@@ -83,9 +90,6 @@ void View::buildToolBar()
 {
     m_toolBar = new QToolBar(this);
     m_toolBar->setIconSize(QSize(16, 16));
-    // Without the icon resources the actions show their texts.
-    if (QIcon(QStringLiteral(":/hexeditor/coloring")).isNull())
-        m_toolBar->setToolButtonStyle(Qt::ToolButtonTextOnly);
     auto make = [this](Action id, const char *icon, const QString &text, const QString &tip) {
         auto *a = new QAction(QIcon(QLatin1String(icon)), text, this);
         a->setToolTip(tip);
