@@ -147,9 +147,10 @@ int Startup::run(const QStringList &argumentList, int &argc, char **argv)
         mainView->build();
         application->registerComponent(Framework::RecentFiles::SettingsElement, mainView->recentFiles());
         application->registerComponent(Framework::MainView::SettingsElement, mainView.get());
+        // This machine's disks are listed before the window shows and before any request of the
+        // command line runs (a request enumerates again when it needs a fresh list).
+        root->RefreshAndWait(false, RefreshKinds(), 30000);
         mainView->show();
-        // This machine's disks join the tree as the enumeration finds them.
-        root->Refresh();
         application->initializationCompleted();
 
         log.add(
