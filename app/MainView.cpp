@@ -221,8 +221,10 @@ void MainView::connectCommands()
     });
     c->setHandler(QStringLiteral("cmdOpen_Explorer"),
                   [this] { windowManager()->openView(QStringLiteral("explorer")); });
-    c->setHandler(QStringLiteral("cmdOpen_Browser"),
-                  [this] { windowManager()->openView(QStringLiteral("browser")); });
+    // "File Browser" waits for its view: until it is registered the command stays disabled.
+    if (windowManager()->isRegistered(QStringLiteral("browser")))
+        c->setHandler(QStringLiteral("cmdOpen_Browser"),
+                      [this] { windowManager()->openView(QStringLiteral("browser")); });
     c->setHandler(QStringLiteral("cmdProperties"),
                   [this] { windowManager()->openView(Framework::PropertyPane::ViewId); });
     if (m_kernel) {
