@@ -44,6 +44,8 @@ EditorCtrl::EditorCtrl(Storage *storage, bool readOnly, QWidget *parent)
 
 EditorCtrl::~EditorCtrl()
 {
+    // A running block transfer ends (its written steps stay) before its owner goes.
+    onThreadStop();
     if (m_storage)
         Clipboard::unregisterStorage(m_storage);
 }
@@ -323,6 +325,22 @@ void EditorCtrl::onTemplateOffsetChanged(quint64 offset, bool isPrimary)
     Q_UNUSED(isPrimary);
     m_templateOffset = offset;
     setCaretOffset(offset);
+}
+
+void EditorCtrl::onFileViewModeChanged(int mode)
+{
+    auto *file = qobject_cast<StorageFile *>(m_storage);
+    if (!file || file->mode() == mode || !queryModeChange())
+        return;
+    if (!file->setMode(mode))
+        return;
+    m_undo.clear();
+    refreshStorageMetrics();
+    m_painter->invalidate();
+    setSelection({});
+    setCaretOffset(file->fileStartOffset());
+    emit commandStateChanged();
+    viewport()->update();
 }
 
 void EditorCtrl::onTemplateNodeActivated(quint64 address)

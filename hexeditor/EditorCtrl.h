@@ -182,6 +182,9 @@ public slots:
     void onTemplateOffsetChanged(quint64 offset, bool isPrimary);
     void onTemplateNodeActivated(quint64 address);
     void onColoringChanged(bool on) { setTemplateColoringEnabled(on); }
+    // A file storage's view mode (disk 0, partition 1, file 2): asks to save applied edits first,
+    // then switches and moves the caret to the file's first byte.
+    void onFileViewModeChanged(int mode);
     // Stops the running block transfer (the status bar's stop button).
     void onThreadStop();
 

@@ -90,10 +90,11 @@ bool EditorCtrl::moveKey(QKeyEvent *event)
     case Qt::Key_PageUp:
     case Qt::Key_PageDown: {
         const int64_t dir = event->key() == Qt::Key_PageUp ? -1 : 1;
-        const int64_t lines = int64_t(pageCount()) * std::max(1, fullyVisibleLines());
-        if (scrollBy(dir * lines))
+        // The view scrolls one page; the caret moves by the pages setting.
+        const int64_t page = std::max(1, fullyVisibleLines());
+        if (scrollBy(dir * page))
             m_painter->invalidate();
-        moveLines(dir * lines);
+        moveLines(dir * page * int64_t(pageCount()));
         syncScrollBars();
         return true;
     }
