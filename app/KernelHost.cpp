@@ -53,6 +53,8 @@ KernelHost::KernelHost(CRoot &root) : m_root(root)
 {
     // The host's own node tree points into the kernel: it goes with the kernel root.
     m_rootGone = QObject::connect(&m_root, &QObject::destroyed, [this] { m_ownNodes.reset(); });
+    // The explorer's nodes open in the hex editor from the start, not only after a request.
+    ensureAttached();
 }
 
 KernelHost::~KernelHost()
