@@ -146,8 +146,9 @@ TEST(VolumeOwnership, PartitionsOwnTheirVolumesAndTheRootAnnouncesThem)
     for (std::uint32_t i = 0; i < device->GetPartitionCount(); ++i) {
         CPartition *p = device->GetPartition(i);
         const auto kind = static_cast<FileSystemKind>(p->GetKind());
-        if (kind == FileSystemKind::Unallocated || kind == FileSystemKind::Extended)
+        if (kind == FileSystemKind::Unallocated || kind == FileSystemKind::Extended) {
             EXPECT_FALSE(p->Volume()) << i;
+        }
     }
     CVolume *fat = withVolume[0]->Volume();
     EXPECT_EQ(withVolume[0]->GetStart(), 2048u);
