@@ -12,6 +12,7 @@
 #include "ViewActions.h"
 #include "ViewResources.h"
 #include "templates/TemplateType.h"
+#include "templates/View.h"
 
 #include "ClientFramework/AppIdentity.h"
 #include "ClientFramework/DialogSeam.h"
@@ -121,6 +122,7 @@ View::View(NodeCore *node, std::unique_ptr<Storage> storage, bool readOnly, QWid
     buildToolBar();
     buildCustomizeMenu();
     buildDocks();
+    setPane(TemplatesPane, new Templates::View(m_editor, m_storage.get()));
     connectEditor();
 
     setWindowTitle(titleText());

@@ -178,7 +178,9 @@ void DeviceMap::relayout()
                 const uint64_t end = qMin<uint64_t>(total, firstOf(p) + sectorsOf(p));
                 int right = i + 1 == parts.size() ? barLeft + barWidth
                                                   : barLeft + int(double(end) / double(total) * barWidth);
-                right = qBound(x + MinSegment, right, barLeft + barWidth);
+                // Tiny partitions keep a visible minimum unless the bar has no room left for it.
+                right = qMin(qMax(right, x + MinSegment), barLeft + barWidth);
+                right = qMax(right, x);
                 m_segments.append({p, QRect(x, y, right - x, RowHeight), label(p), false});
                 x = right;
             }
