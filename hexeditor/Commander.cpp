@@ -24,11 +24,6 @@ namespace HexEditor {
 
 namespace {
 
-QString tr(const char *text)
-{
-    return QCoreApplication::translate("HexEditor::Commander", text);
-}
-
 // The volume node a file or folder node lives on.
 NodeDrive *driveOf(NodeCore *node)
 {
