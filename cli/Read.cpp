@@ -6,6 +6,7 @@
 #include "Kernel/Implementation/Device.h"
 #include "Kernel/Implementation/HexDump.h"
 #include "Kernel/Implementation/Root.h"
+#include "Number.h"
 #include "Source.h"
 
 namespace Cli {
@@ -16,16 +17,6 @@ namespace {
 constexpr std::uint64_t Piece = 1 << 20;
 
 // A decimal or 0x-prefixed hexadecimal byte count.
-bool parseNumber(const QString &text, std::uint64_t &value)
-{
-    bool ok = false;
-    if (text.startsWith(QLatin1String("0x"), Qt::CaseInsensitive))
-        value = text.mid(2).toULongLong(&ok, 16);
-    else
-        value = text.toULongLong(&ok, 10);
-    return ok;
-}
-
 int usage(Io &io, const QString &problem)
 {
     io.err << "brindle-cli read: " << problem << "\n"

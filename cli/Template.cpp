@@ -4,6 +4,7 @@
 
 #include "Kernel/Implementation/Device.h"
 #include "Kernel/Implementation/Root.h"
+#include "Number.h"
 #include "Source.h"
 #include "TemplateSource.h"
 #include "hexeditor/templates/core/Catalog.h"
@@ -15,16 +16,6 @@ namespace Cli {
 namespace {
 
 namespace T = HexEditor::Templates;
-
-bool parseNumber(const QString &text, std::uint64_t &value)
-{
-    bool ok = false;
-    if (text.startsWith(QLatin1String("0x"), Qt::CaseInsensitive))
-        value = text.mid(2).toULongLong(&ok, 16);
-    else
-        value = text.toULongLong(&ok, 10);
-    return ok;
-}
 
 int usage(Io &io, const QString &problem)
 {

@@ -6,6 +6,7 @@
 
 #include "Kernel/Implementation/Device.h"
 #include "Kernel/Implementation/Root.h"
+#include "Number.h"
 #include "Source.h"
 #include "hexeditor/StorageSectorWrite.h"
 #include "hexeditor/StorageWriteGuard.h"
@@ -16,16 +17,6 @@ namespace {
 
 // The most a single write command takes (the editor's own limit for one edit is far lower).
 constexpr qint64 MaxInput = qint64(1) << 30;
-
-bool parseNumber(const QString &text, std::uint64_t &value)
-{
-    bool ok = false;
-    if (text.startsWith(QLatin1String("0x"), Qt::CaseInsensitive))
-        value = text.mid(2).toULongLong(&ok, 16);
-    else
-        value = text.toULongLong(&ok, 10);
-    return ok;
-}
 
 // Hexadecimal digit pairs; blanks, colons and dashes between pairs are allowed.
 bool parseHex(const QString &text, QByteArray &bytes)
