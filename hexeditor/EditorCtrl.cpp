@@ -15,6 +15,31 @@
 
 namespace HexEditor {
 
+namespace {
+
+// Scrolls horizontally just enough that the caret's byte box lies inside the viewport. Going left,
+// the view returns to the line's start when the caret fits there, so the offsets come back into sight.
+void followCaretHorizontally(EditorCtrl &ctrl)
+{
+    QScrollBar *h = ctrl.horizontalScrollBar();
+    const int width = ctrl.viewport()->width();
+    const Metrics::Caret &caret = ctrl.caret();
+    const auto pane = Metrics::Pane(caret.pane);
+    if (width <= 0 || !ctrl.isShown(pane) || pane == Metrics::PaneOffset)
+        return;
+    const int left = std::max(0, ctrl.byteLeft(pane, caret.column));
+    const int right = ctrl.byteRight(pane, caret.column);
+    int value = h->value();
+    if (left < value)
+        value = right <= width ? 0 : left;
+    else if (right > value + width)
+        value = right - width > left ? left : right - width;
+    if (value != h->value())
+        h->setValue(std::clamp(value, h->minimum(), h->maximum()));
+}
+
+} // namespace
+
 EditorCtrl::EditorCtrl(Storage *storage, bool readOnly, QWidget *parent)
     : QAbstractScrollArea(parent), m_painter(std::make_unique<Painter>()), m_editable(!readOnly),
       m_palette(PaintPalette::current())
@@ -126,6 +151,7 @@ void EditorCtrl::placeCaret(uint64_t offset, int32_t pane, int32_t nibble)
     if (scrollIntoView(m_caret.line))
         m_painter->invalidate();
     syncScrollBars();
+    followCaretHorizontally(*this);
     caretChanged();
     viewport()->update();
 }
