@@ -1,5 +1,7 @@
 #include "Commander.h"
 
+#include "EditorCtrl.h"
+#include "HexEditorSheet.h"
 #include "Storage.h"
 #include "StorageFactory.h"
 #include "View.h"
@@ -231,6 +233,22 @@ void Commander::onOpenFileCommand()
                    : QFileDialog::getOpenFileName(nullptr, tr("Open File"), QString(), tr("All Files (*)"));
     if (!path.isEmpty())
         openFile(path);
+}
+
+QList<Framework::IPreferencePage *> Commander::createPreferencePages()
+{
+    auto *sheet = new HexEditorSheet;
+    QPointer<Commander> self(this);
+    sheet->setApplier([self](const HexEditorSheet::Values &values) {
+        if (!self)
+            return;
+        for (View *view : self->views()) {
+            HexEditorSheet::applyTo(view->editor(), values);
+            view->onEditorStateChanged(view->editor()->hexOffset(), view->editor()->isReadOnly(),
+                                       view->editor()->isBigEndian());
+        }
+    });
+    return {sheet};
 }
 
 QList<View *> Commander::views() const

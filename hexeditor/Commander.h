@@ -1,10 +1,12 @@
 // The hex editor's feature commander: the commands that open nodes in hex editor views
 // ("cmdHex_NodeOpen", "cmdHex_FileRecord", and the product's "cmdHex_File" for a plain file), the
-// openInHexEditor requests of explorers and of the command line, and the views it opened.
+// openInHexEditor requests of explorers and of the command line, the views it opened, and the
+// editor's page of the preferences dialog.
 #pragma once
 
 #include "ClientFramework/Commands/Commander.h"
 #include "ClientFramework/Commands/FeatureCommander.h"
+#include "ClientFramework/Preferences/IPreferencePage.h"
 
 #include <QList>
 #include <QObject>
@@ -24,7 +26,7 @@ namespace HexEditor {
 
 class View;
 
-class Commander : public QObject, public IFeatureCommander
+class Commander : public QObject, public IFeatureCommander, public Framework::IPreferencePageSource
 {
     Q_OBJECT
 public:
@@ -44,6 +46,9 @@ public:
     void registerViews(Framework::WindowManager &windows) override;
     bool execute(const QString &id, const QList<NodeCore *> &nodes) override;
     void updateCommands(const QList<NodeCore *> &selection) override;
+
+    // Framework::IPreferencePageSource: the editor's page, which applies to every open view.
+    QList<Framework::IPreferencePage *> createPreferencePages() override;
 
     // The kernel root plain files are opened through (not owned).
     void setKernelRoot(cRoot *root) { m_root = root; }

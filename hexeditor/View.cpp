@@ -20,6 +20,7 @@
 #include "ClientFramework/NodeTree/IStorageGeometry.h"
 #include "ClientFramework/NodeTree/NodeCore.h"
 #include "ClientFramework/NodeTree/NodeDevice.h"
+#include "ClientFramework/Settings/SettingsDocument.h"
 #include "Kernel/Implementation/Device.h"
 #include "Kernel/Implementation/FS/Volume.h"
 
@@ -691,14 +692,15 @@ QList<QAction *> View::widgetActions(Menu menu) const
 
 void View::save(QDomElement &element, bool flush)
 {
-    m_editor->save(element, flush);
+    QDomElement editor = Framework::SettingsDocument::child(element, EditorSettingsElement);
+    m_editor->save(editor, flush);
     if (fileViewMode() >= 0)
         element.setAttribute(QStringLiteral("mode"), fileViewMode());
 }
 
 void View::load(const QDomElement &element)
 {
-    m_editor->load(element);
+    m_editor->load(element.firstChildElement(EditorSettingsElement));
     if (element.hasAttribute(QStringLiteral("mode")) && fileViewMode() >= 0) {
         bool ok = false;
         const int mode = element.attribute(QStringLiteral("mode")).toInt(&ok);

@@ -37,6 +37,8 @@ class View : public Framework::GenericView
     Q_OBJECT
 public:
     static inline const QString ViewId = QStringLiteral("view-hexeditor");
+    // The child of the view's settings element that holds the editor control's settings.
+    static inline const QString EditorSettingsElement = QStringLiteral("hex-editor");
     // Object names of the docked panes; each dock is named after its pane with "-dock".
     static inline const QString TemplatesPane = QStringLiteral("view-hex-templates");
     static inline const QString InspectorPane = QStringLiteral("view-hex-inspector");

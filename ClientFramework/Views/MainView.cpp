@@ -3,6 +3,8 @@
 #include "AppIdentity.h"
 #include "Commands/Commander.h"
 #include "DialogSeam.h"
+#include "Help/HelpDocument.h"
+#include "Preferences/PreferencesCommand.h"
 #include "Settings/SettingsDocument.h"
 #include "Views/GenericView.h"
 #include "Views/LogView.h"
@@ -138,6 +140,11 @@ void MainView::connectCommands()
     m_commander->setHandler(QStringLiteral("cmdExitApp"), [this] { close(); });
     m_commander->setHandler(QStringLiteral("cmdOpenLogView"),
                             [this] { m_windows->openView(LogView::ViewId); });
+    Preferences::installCommand(*m_commander, this);
+    Help::installCommands(*m_commander);
+    // "Help Contents" is in no menu; its shortcut works window-wide.
+    if (QAction *contents = m_commander->action(QStringLiteral("cmdHelpContents")))
+        addAction(contents);
     m_commander->setHandler(QStringLiteral("cmdAbout"), [] {
         DialogSeam::current().message(QMessageBox::Information, tr("About %1").arg(Identity::ShortName),
                                       tr("<h2>%1</h2><p>Version: <b>%2 (%3)</b></p>")

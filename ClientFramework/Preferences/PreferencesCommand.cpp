@@ -1,0 +1,39 @@
+#include "PreferencesCommand.h"
+
+#include "Commands/Commander.h"
+#include "Preferences/IPreferencePage.h"
+#include "Preferences/PreferencesDlg.h"
+
+#include <QPointer>
+
+namespace Framework::Preferences {
+
+PreferencesDlg *createDialog(const Core::Commander &commander, QWidget *parent,
+                             const QList<IPreferencePageSource *> &extraSources)
+{
+    auto *dialog = new PreferencesDlg(parent);
+    QList<IPreferencePageSource *> sources;
+    for (IFeatureCommander *feature : commander.features())
+        if (auto *source = dynamic_cast<IPreferencePageSource *>(feature))
+            sources.append(source);
+    sources.append(extraSources);
+    for (IPreferencePageSource *source : std::as_const(sources))
+        if (source)
+            for (IPreferencePage *page : source->createPreferencePages())
+                dialog->addPage(page);
+    return dialog;
+}
+
+void installCommand(Core::Commander &commander, QWidget *parent,
+                    const QList<IPreferencePageSource *> &extraSources)
+{
+    QPointer<QWidget> owner(parent);
+    commander.setHandler(QStringLiteral("cmdSettings"), [&commander, owner, extraSources] {
+        // The window may go while the dialog runs; the dialog then went with it.
+        QPointer<PreferencesDlg> dialog = createDialog(commander, owner.data(), extraSources);
+        dialog->run();
+        delete dialog.data();
+    });
+}
+
+} // namespace Framework::Preferences
