@@ -13,6 +13,71 @@ QColor c(const char *text)
     return PaintPalette::parseColor(QString::fromLatin1(text));
 }
 
+// One colour of the palette: where a theme gives it (the attribute of a child of "hex-view"; the
+// palette entry is "element-attribute") and its built-in values in the default and the dark theme.
+struct Entry
+{
+    const char *element;
+    const char *attribute;
+    const char *light;
+    const char *dark;
+    QColor PaintPalette::*color = nullptr;
+    PaintPalette::Pair PaintPalette::*pair = nullptr;
+    QColor PaintPalette::Pair::*side = nullptr;
+
+    QColor &in(PaintPalette &p) const { return pair ? (p.*pair).*side : p.*color; }
+    QString themeEntry() const
+    {
+        return QString::fromLatin1(element) + u'-' + QString::fromLatin1(attribute);
+    }
+};
+
+using P = PaintPalette;
+using Pair = PaintPalette::Pair;
+
+const Entry g_entries[] = {
+    {"text", "default", "#000000", "#BBB", &P::text},
+    {"text", "header", "#0000BE", "#EBCD8C", &P::header},
+    {"text", "disabled", "#808080", "#999", &P::disabled},
+    {"text", "modified", "#FFC8C8", "#FFB", &P::modified},
+    {"text", "link", "#0072BC", "#87BED2", &P::link},
+    {"elements", "lines", "#B4B4B4", "#4B5569", &P::lines},
+    {"elements", "grid", "#DCDCDC", "#4B5569", &P::grid},
+    {"elements", "watermark", "#FF877D", "#FF877D", &P::watermark},
+    {"elements", "background", "#FFFFFF", "#323746", &P::background},
+    {"elements", "background-selected", "#C8DCEBFF", "#4B5569", &P::selected},
+    {"cursor", "foreground", "#FFFFFF", "#000000", nullptr, &P::cursor, &Pair::foreground},
+    {"cursor", "background", "#0000FF", "#FFC814", nullptr, &P::cursor, &Pair::background},
+    {"cursor", "inactive", "#C3C3E6", "#69613E", &P::cursorInactive},
+    {"bookmark", "from", "#7CB5DF", "#3C4150", &P::bookmarkFrom},
+    {"bookmark", "to", "#D0F7FF", "#87BED2", &P::bookmarkTo},
+    {"bookmark", "border", "#002E54", "#323746", &P::bookmarkBorder},
+    {"bookmark", "corner", "#6D92AE", "#323746", &P::bookmarkCorner},
+    {"searched", "foreground", "#C8A00000", "#A00000C8", nullptr, &P::searched, &Pair::foreground},
+    {"searched", "background", "#F0F064C8", "#70AA7733", nullptr, &P::searched, &Pair::background},
+    {"ghosted", "foreground", "#C8A00000", "#4482A0C3", nullptr, &P::ghosted, &Pair::foreground},
+    {"ghosted", "background", "#F5F5F0", "#3C4150", nullptr, &P::ghosted, &Pair::background},
+    {"template-palette", "item", "#437EAA", "#437EAA", &P::templateItem},
+};
+
+// The field colouring's built-in pairs: foreground and background of the default, then of the dark theme.
+const char *const g_items[][4] = {
+    {"#DC2F32", "#FFEBEC", "#880000", "#22880000"},   {"#329600", "#EBFFE1", "#008800", "#22008800"},
+    {"#FFAF0F", "#FFFDE1", "#AAAA00", "#22AAAA00"},   {"#D22DD2", "#FFF0FF", "#AA88AA", "#33AA88AA"},
+    {"#437EAA", "#EDF8FF", "#66000088", "#33000088"},
+};
+
+PaintPalette builtIn(bool dark)
+{
+    PaintPalette p;
+    for (const Entry &e : g_entries)
+        e.in(p) = c(dark ? e.dark : e.light);
+    const int at = dark ? 2 : 0;
+    for (const auto &item : g_items)
+        p.templateItems.append({c(item[at]), c(item[at + 1])});
+    return p;
+}
+
 void take(const QDomElement &e, const char *attr, QColor &target)
 {
     if (e.isNull() || !e.hasAttribute(QString::fromLatin1(attr)))
@@ -37,62 +102,12 @@ QColor PaintPalette::parseColor(const QString &text)
 
 PaintPalette PaintPalette::defaultTheme()
 {
-    PaintPalette p;
-    p.text = c("#000000");
-    p.header = c("#0000BE");
-    p.disabled = c("#808080");
-    p.modified = c("#FFC8C8");
-    p.link = c("#0072BC");
-    p.lines = c("#B4B4B4");
-    p.grid = c("#DCDCDC");
-    p.watermark = c("#FF877D");
-    p.background = c("#FFFFFF");
-    p.selected = c("#C8DCEBFF");
-    p.cursor = {c("#FFFFFF"), c("#0000FF")};
-    p.cursorInactive = c("#C3C3E6");
-    p.bookmarkFrom = c("#7CB5DF");
-    p.bookmarkTo = c("#D0F7FF");
-    p.bookmarkBorder = c("#002E54");
-    p.bookmarkCorner = c("#6D92AE");
-    p.searched = {c("#C8A00000"), c("#F0F064C8")};
-    p.ghosted = {c("#C8A00000"), c("#F5F5F0")};
-    p.templateItem = c("#437EAA");
-    p.templateItems = {{c("#DC2F32"), c("#FFEBEC")},
-                       {c("#329600"), c("#EBFFE1")},
-                       {c("#FFAF0F"), c("#FFFDE1")},
-                       {c("#D22DD2"), c("#FFF0FF")},
-                       {c("#437EAA"), c("#EDF8FF")}};
-    return p;
+    return builtIn(false);
 }
 
 PaintPalette PaintPalette::darkTheme()
 {
-    PaintPalette p;
-    p.text = c("#BBB");
-    p.header = c("#EBCD8C");
-    p.disabled = c("#999");
-    p.modified = c("#FFB");
-    p.link = c("#87BED2");
-    p.lines = c("#4B5569");
-    p.grid = c("#4B5569");
-    p.watermark = c("#FF877D");
-    p.background = c("#323746");
-    p.selected = c("#4B5569");
-    p.cursor = {c("#000000"), c("#FFC814")};
-    p.cursorInactive = c("#69613E");
-    p.bookmarkFrom = c("#3C4150");
-    p.bookmarkTo = c("#87BED2");
-    p.bookmarkBorder = c("#323746");
-    p.bookmarkCorner = c("#323746");
-    p.searched = {c("#A00000C8"), c("#70AA7733")};
-    p.ghosted = {c("#4482A0C3"), c("#3C4150")};
-    p.templateItem = c("#437EAA");
-    p.templateItems = {{c("#880000"), c("#22880000")},
-                       {c("#008800"), c("#22008800")},
-                       {c("#AAAA00"), c("#22AAAA00")},
-                       {c("#AA88AA"), c("#33AA88AA")},
-                       {c("#66000088"), c("#33000088")}};
-    return p;
+    return builtIn(true);
 }
 
 PaintPalette PaintPalette::fromElement(const QDomElement &hexView, const PaintPalette &base)
@@ -100,35 +115,9 @@ PaintPalette PaintPalette::fromElement(const QDomElement &hexView, const PaintPa
     PaintPalette p = base;
     if (hexView.isNull())
         return p;
-    const QDomElement text = hexView.firstChildElement(QStringLiteral("text"));
-    take(text, "default", p.text);
-    take(text, "header", p.header);
-    take(text, "disabled", p.disabled);
-    take(text, "modified", p.modified);
-    take(text, "link", p.link);
-    const QDomElement el = hexView.firstChildElement(QStringLiteral("elements"));
-    take(el, "lines", p.lines);
-    take(el, "grid", p.grid);
-    take(el, "watermark", p.watermark);
-    take(el, "background", p.background);
-    take(el, "background-selected", p.selected);
-    const QDomElement cursor = hexView.firstChildElement(QStringLiteral("cursor"));
-    take(cursor, "foreground", p.cursor.foreground);
-    take(cursor, "background", p.cursor.background);
-    take(cursor, "inactive", p.cursorInactive);
-    const QDomElement bm = hexView.firstChildElement(QStringLiteral("bookmark"));
-    take(bm, "from", p.bookmarkFrom);
-    take(bm, "to", p.bookmarkTo);
-    take(bm, "border", p.bookmarkBorder);
-    take(bm, "corner", p.bookmarkCorner);
-    const QDomElement searched = hexView.firstChildElement(QStringLiteral("searched"));
-    take(searched, "foreground", p.searched.foreground);
-    take(searched, "background", p.searched.background);
-    const QDomElement ghosted = hexView.firstChildElement(QStringLiteral("ghosted"));
-    take(ghosted, "foreground", p.ghosted.foreground);
-    take(ghosted, "background", p.ghosted.background);
+    for (const Entry &e : g_entries)
+        take(hexView.firstChildElement(QString::fromLatin1(e.element)), e.attribute, e.in(p));
     const QDomElement tp = hexView.firstChildElement(QStringLiteral("template-palette"));
-    take(tp, "item", p.templateItem);
     QList<Pair> items;
     for (QDomElement item = tp.firstChildElement(QStringLiteral("item")); !item.isNull();
          item = item.nextSiblingElement(QStringLiteral("item"))) {
@@ -150,38 +139,16 @@ PaintPalette PaintPalette::fromTheme(const Framework::Theme &theme)
     if (!theme.hasPalette(palette))
         return base;
     PaintPalette p = base;
-    auto get = [&](const char *entry, QColor &target) {
-        const QStringList entries = theme.paletteEntries(palette);
-        if (entries.contains(QLatin1String(entry)))
-            target = theme.color(palette, QLatin1String(entry), target);
+    const QStringList entries = theme.paletteEntries(palette);
+    auto get = [&](const QString &entry, QColor &target) {
+        if (entries.contains(entry))
+            target = theme.color(palette, entry, target);
     };
-    get("text-default", p.text);
-    get("text-header", p.header);
-    get("text-disabled", p.disabled);
-    get("text-modified", p.modified);
-    get("text-link", p.link);
-    get("elements-lines", p.lines);
-    get("elements-grid", p.grid);
-    get("elements-watermark", p.watermark);
-    get("elements-background", p.background);
-    get("elements-background-selected", p.selected);
-    get("cursor-foreground", p.cursor.foreground);
-    get("cursor-background", p.cursor.background);
-    get("cursor-inactive", p.cursorInactive);
-    get("bookmark-from", p.bookmarkFrom);
-    get("bookmark-to", p.bookmarkTo);
-    get("bookmark-border", p.bookmarkBorder);
-    get("bookmark-corner", p.bookmarkCorner);
-    get("searched-foreground", p.searched.foreground);
-    get("searched-background", p.searched.background);
-    get("ghosted-foreground", p.ghosted.foreground);
-    get("ghosted-background", p.ghosted.background);
-    get("template-palette-item", p.templateItem);
+    for (const Entry &e : g_entries)
+        get(e.themeEntry(), e.in(p));
     for (int i = 0; i < p.templateItems.size(); ++i) {
-        const QByteArray fg = QStringLiteral("template-palette-item%1-foreground").arg(i + 1).toLatin1();
-        const QByteArray bg = QStringLiteral("template-palette-item%1-background").arg(i + 1).toLatin1();
-        get(fg.constData(), p.templateItems[i].foreground);
-        get(bg.constData(), p.templateItems[i].background);
+        get(QStringLiteral("template-palette-item%1-foreground").arg(i + 1), p.templateItems[i].foreground);
+        get(QStringLiteral("template-palette-item%1-background").arg(i + 1), p.templateItems[i].background);
     }
     return p;
 }
@@ -207,29 +174,8 @@ QColor PaintPalette::grey(const QColor &color)
 PaintPalette PaintPalette::greyed() const
 {
     PaintPalette p = *this;
-    for (QColor *col : {&p.text,
-                        &p.header,
-                        &p.disabled,
-                        &p.modified,
-                        &p.link,
-                        &p.lines,
-                        &p.grid,
-                        &p.watermark,
-                        &p.background,
-                        &p.selected,
-                        &p.cursor.foreground,
-                        &p.cursor.background,
-                        &p.cursorInactive,
-                        &p.bookmarkFrom,
-                        &p.bookmarkTo,
-                        &p.bookmarkBorder,
-                        &p.bookmarkCorner,
-                        &p.searched.foreground,
-                        &p.searched.background,
-                        &p.ghosted.foreground,
-                        &p.ghosted.background,
-                        &p.templateItem})
-        *col = grey(*col);
+    for (const Entry &e : g_entries)
+        e.in(p) = grey(e.in(p));
     for (Pair &pair : p.templateItems) {
         pair.foreground = grey(pair.foreground);
         pair.background = grey(pair.background);
