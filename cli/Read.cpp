@@ -6,7 +6,7 @@
 #include "Kernel/Implementation/Device.h"
 #include "Kernel/Implementation/HexDump.h"
 #include "Kernel/Implementation/Root.h"
-#include "Number.h"
+#include "OptionReader.h"
 #include "Source.h"
 
 namespace Cli {
@@ -16,7 +16,6 @@ namespace {
 // Bytes fetched per kernel request; the output follows each piece.
 constexpr std::uint64_t Piece = 1 << 20;
 
-// A decimal or 0x-prefixed hexadecimal byte count.
 int usage(Io &io, const QString &problem)
 {
     io.err << "brindle-cli read: " << problem << "\n"
@@ -28,29 +27,17 @@ int usage(Io &io, const QString &problem)
 
 int runRead(const QStringList &args, Io &io)
 {
-    QString source;
+    QString source, problem;
     std::uint64_t offset = 0, length = 0;
     bool haveOffset = false, haveLength = false, raw = false;
-    for (int i = 0; i < args.size(); ++i) {
-        const QString &a = args[i];
-        if (a == QLatin1String("--raw")) {
-            raw = true;
-        } else if (a == QLatin1String("--offset") || a == QLatin1String("--length")) {
-            if (i + 1 >= args.size())
-                return usage(io, QStringLiteral("%1 needs a value").arg(a));
-            std::uint64_t v = 0;
-            if (!parseNumber(args[++i], v))
-                return usage(io, QStringLiteral("'%1' is not a byte count").arg(args[i]));
-            (a == QLatin1String("--offset") ? offset : length) = v;
-            (a == QLatin1String("--offset") ? haveOffset : haveLength) = true;
-        } else if (a.startsWith(QLatin1String("--"))) {
-            return usage(io, QStringLiteral("unknown option '%1'").arg(a));
-        } else if (source.isEmpty()) {
-            source = a;
-        } else {
-            return usage(io, QStringLiteral("more than one source given"));
-        }
-    }
+    OptionReader options;
+    options.flag(QStringLiteral("--raw"), raw);
+    options.number(QStringLiteral("--offset"), offset, haveOffset,
+                   QStringLiteral("'%1' is not a byte count"));
+    options.number(QStringLiteral("--length"), length, haveLength,
+                   QStringLiteral("'%1' is not a byte count"));
+    if (!options.read(args, source, problem))
+        return usage(io, problem);
     if (source.isEmpty())
         return usage(io, QStringLiteral("no source given"));
     if (!haveOffset || !haveLength)

@@ -4,7 +4,7 @@
 
 #include "Kernel/Implementation/Device.h"
 #include "Kernel/Implementation/Root.h"
-#include "Number.h"
+#include "OptionReader.h"
 #include "Source.h"
 #include "TemplateSource.h"
 #include "hexeditor/templates/core/Catalog.h"
@@ -37,38 +37,25 @@ QString kindList()
 
 int runTemplate(const QStringList &args, Io &io)
 {
-    QString source;
+    QString source, problem;
     int type = -1;
     std::uint64_t offset = 0, copyOffset = 0;
     bool haveOffset = false, haveCopy = false, json = false;
-    for (int i = 0; i < args.size(); ++i) {
-        const QString &a = args[i];
-        if (a == QLatin1String("--json")) {
-            json = true;
-        } else if (a == QLatin1String("--auto")) {
-            type = T::Automatic;
-        } else if (a == QLatin1String("--type")) {
-            if (i + 1 >= args.size())
-                return usage(io, QStringLiteral("--type needs a value"));
-            type = T::typeFromText(args[++i]);
-            if (type < 0)
-                return usage(io, QStringLiteral("'%1' is no template kind").arg(args[i]));
-        } else if (a == QLatin1String("--offset") || a == QLatin1String("--copy-offset")) {
-            if (i + 1 >= args.size())
-                return usage(io, QStringLiteral("%1 needs a value").arg(a));
-            std::uint64_t v = 0;
-            if (!parseNumber(args[++i], v))
-                return usage(io, QStringLiteral("'%1' is not a byte offset").arg(args[i]));
-            (a == QLatin1String("--offset") ? offset : copyOffset) = v;
-            (a == QLatin1String("--offset") ? haveOffset : haveCopy) = true;
-        } else if (a.startsWith(QLatin1String("--"))) {
-            return usage(io, QStringLiteral("unknown option '%1'").arg(a));
-        } else if (source.isEmpty()) {
-            source = a;
-        } else {
-            return usage(io, QStringLiteral("more than one source given"));
-        }
-    }
+    OptionReader options;
+    options.flag(QStringLiteral("--json"), json);
+    options.flag(QStringLiteral("--auto"), [&type] { type = T::Automatic; });
+    options.value(
+        QStringLiteral("--type"),
+        [&type](const QString &v) {
+            type = T::typeFromText(v);
+            return type >= 0;
+        },
+        QStringLiteral("'%1' is no template kind"));
+    const QString notOffset = QStringLiteral("'%1' is not a byte offset");
+    options.number(QStringLiteral("--offset"), offset, haveOffset, notOffset);
+    options.number(QStringLiteral("--copy-offset"), copyOffset, haveCopy, notOffset);
+    if (!options.read(args, source, problem))
+        return usage(io, problem);
     if (source.isEmpty())
         return usage(io, QStringLiteral("no source given"));
     if (type < 0)

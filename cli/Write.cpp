@@ -6,7 +6,7 @@
 
 #include "Kernel/Implementation/Device.h"
 #include "Kernel/Implementation/Root.h"
-#include "Number.h"
+#include "OptionReader.h"
 #include "Source.h"
 #include "hexeditor/StorageSectorWrite.h"
 #include "hexeditor/StorageWriteGuard.h"
@@ -46,37 +46,17 @@ int usage(Io &io, const QString &problem)
 
 int runWrite(const QStringList &args, Io &io)
 {
-    QString source, hex, file;
+    QString source, hex, file, problem;
     std::uint64_t offset = 0;
     bool haveOffset = false, haveHex = false, haveFile = false, yes = false;
-    for (int i = 0; i < args.size(); ++i) {
-        const QString &a = args[i];
-        if (a == QLatin1String("--yes")) {
-            yes = true;
-        } else if (a == QLatin1String("--offset") || a == QLatin1String("--hex") ||
-                   a == QLatin1String("--file")) {
-            if (i + 1 >= args.size())
-                return usage(io, QStringLiteral("%1 needs a value").arg(a));
-            const QString &v = args[++i];
-            if (a == QLatin1String("--offset")) {
-                if (!parseNumber(v, offset))
-                    return usage(io, QStringLiteral("'%1' is not a byte offset").arg(v));
-                haveOffset = true;
-            } else if (a == QLatin1String("--hex")) {
-                hex = v;
-                haveHex = true;
-            } else {
-                file = v;
-                haveFile = true;
-            }
-        } else if (a.startsWith(QLatin1String("--"))) {
-            return usage(io, QStringLiteral("unknown option '%1'").arg(a));
-        } else if (source.isEmpty()) {
-            source = a;
-        } else {
-            return usage(io, QStringLiteral("more than one source given"));
-        }
-    }
+    OptionReader options;
+    options.flag(QStringLiteral("--yes"), yes);
+    options.number(QStringLiteral("--offset"), offset, haveOffset,
+                   QStringLiteral("'%1' is not a byte offset"));
+    options.text(QStringLiteral("--hex"), hex, haveHex);
+    options.text(QStringLiteral("--file"), file, haveFile);
+    if (!options.read(args, source, problem))
+        return usage(io, problem);
     if (source.isEmpty())
         return usage(io, QStringLiteral("no source given"));
     if (!haveOffset)
