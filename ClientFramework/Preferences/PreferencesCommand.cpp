@@ -2,6 +2,7 @@
 
 #include "Commands/Commander.h"
 #include "Preferences/IPreferencePage.h"
+#include "Preferences/LogSheet.h"
 #include "Preferences/PreferencesDlg.h"
 
 #include <QPointer>
@@ -28,9 +29,12 @@ void installCommand(Core::Commander &commander, QWidget *parent,
                     const QList<IPreferencePageSource *> &extraSources)
 {
     QPointer<QWidget> owner(parent);
-    commander.setHandler(QStringLiteral("cmdSettings"), [&commander, owner, extraSources] {
+    // The framework's own pages come after those of the features.
+    QList<IPreferencePageSource *> sources = extraSources;
+    sources.append(&frameworkPreferencePages());
+    commander.setHandler(QStringLiteral("cmdSettings"), [&commander, owner, sources] {
         // The window may go while the dialog runs; the dialog then went with it.
-        QPointer<PreferencesDlg> dialog = createDialog(commander, owner.data(), extraSources);
+        QPointer<PreferencesDlg> dialog = createDialog(commander, owner.data(), sources);
         dialog->run();
         delete dialog.data();
     });

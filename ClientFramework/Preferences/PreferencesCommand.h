@@ -21,7 +21,8 @@ namespace Preferences {
 PreferencesDlg *createDialog(const Core::Commander &commander, QWidget *parent,
                              const QList<IPreferencePageSource *> &extraSources = {});
 
-// Connects cmdSettings to a dialog made by createDialog and shown through PreferencesDlg::run.
+// Connects cmdSettings to a dialog made by createDialog and shown through PreferencesDlg::run: the
+// pages of the features, of the extra sources, then the framework's own (the application log).
 void installCommand(Core::Commander &commander, QWidget *parent,
                     const QList<IPreferencePageSource *> &extraSources = {});
 
