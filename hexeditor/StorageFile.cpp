@@ -4,7 +4,6 @@
 #include "Kernel/Implementation/FS/Volume.h"
 #include "Kernel/Implementation/Partition.h"
 #include "Kernel/Implementation/cDevice.h"
-#include "StorageVolumeInfo.h"
 
 namespace HexEditor {
 
@@ -15,20 +14,21 @@ constexpr std::uint32_t AttrRunsInSectors = 0x20000000;
 
 } // namespace
 
-StorageFile::StorageFile(CEntry *entry, QObject *parent) : Storage(nullptr, parent), m_entry(entry)
+StorageFile::StorageFile(CEntry *entry, QObject *parent)
+    : StorageVolumeBase(nullptr, entry ? entry->GetVolume() : nullptr, parent), m_entry(entry)
 {
     if (!m_entry)
         return;
-    m_volume = m_entry->GetVolume();
-    m_partition = m_volume ? dynamic_cast<cPartition *>(m_volume->GetMedium()) : nullptr;
+    CVolume *volume = this->volume();
+    m_partition = volume ? dynamic_cast<cPartition *>(volume->GetMedium()) : nullptr;
     m_device = m_partition ? m_partition->GetDevice() : nullptr;
     if (m_partition)
         m_partitionFirstSector = m_partition->GetStart();
     setTitle(m_entry->GetDisplayName());
 
-    const std::uint32_t kind = m_volume ? m_volume->GetKind() : 24;
+    const std::uint32_t kind = volume ? volume->GetKind() : 24;
     m_extentsInSectors = (m_entry->GetAttributes() & AttrRunsInSectors) || (kind >= 13 && kind <= 17);
-    cStorage *medium = m_volume ? m_volume->GetMedium() : nullptr;
+    cStorage *medium = volume ? volume->GetMedium() : nullptr;
     const std::uint64_t ss = medium ? medium->GetBytesPerSector() : 0;
     if (!(m_entry->GetAttributes() & AttrNoRuns) && ss) {
         (void)m_entry->GetSize(); // the file system fills the runs on first use
@@ -50,10 +50,6 @@ StorageFile::StorageFile(CEntry *entry, QObject *parent) : Storage(nullptr, pare
                 m_startInPartition = first * ss;
         }
     }
-    if (kind == 10)
-        m_mftRecordSize = VolumeInfoQuery::mftRecordSize(m_volume);
-    if (kind >= 13 && kind <= 16)
-        m_inodeSize = VolumeInfoQuery::inodeSize(m_volume, m_inodeSize);
     if (m_device)
         setKernelObject(m_device);
     else
@@ -111,51 +107,18 @@ bool StorageFile::isFileSector(std::uint64_t s) const
     return p >= it.key() && p <= it.value();
 }
 
-std::uint32_t StorageFile::fileSystemKind() const
+bool StorageFile::volumeBase(std::uint64_t &base) const
 {
-    return m_volume ? m_volume->GetKind() : 24;
-}
-
-std::uint32_t StorageFile::clusterSize() const
-{
-    return m_volume ? m_volume->GetClusterSize() : 0;
-}
-
-std::uint64_t StorageFile::mftRecordCount() const
-{
-    return VolumeInfoQuery::mftRecordCount(m_volume);
-}
-
-std::uint64_t StorageFile::mftRecordOffset(std::uint64_t index) const
-{
-    if (m_mode == FileMode)
-        return 0;
-    const std::uint64_t base =
-        m_mode == DiskMode && m_device ? m_partitionFirstSector * m_device->GetBytesPerSector() : 0;
-    return VolumeInfoQuery::mftRecordOffset(m_volume, index, base, sectorCount());
-}
-
-std::uint64_t StorageFile::catalogNodeCount() const
-{
-    return VolumeInfoQuery::catalogNodeCount(m_volume);
-}
-
-std::uint64_t StorageFile::catalogNodeOffset(std::uint64_t index) const
-{
-    if (m_mode == FileMode)
-        return 0;
-    const std::uint64_t base =
-        m_mode == DiskMode && m_device ? m_partitionFirstSector * m_device->GetBytesPerSector() : 0;
-    return VolumeInfoQuery::catalogNodeOffset(m_volume, index, base);
+    base = m_mode == DiskMode && m_device ? m_partitionFirstSector * m_device->GetBytesPerSector() : 0;
+    return m_mode != FileMode;
 }
 
 QList<NavigationPoint> StorageFile::buildNavigationPoints()
 {
-    if (!m_entry || !m_volume || m_mode == FileMode)
+    std::uint64_t base = 0;
+    if (!m_entry || !volume() || !volumeBase(base))
         return {};
-    const std::uint64_t base =
-        m_mode == DiskMode && m_device ? m_partitionFirstSector * m_device->GetBytesPerSector() : 0;
-    const std::uint32_t kind = m_volume->GetKind();
+    const std::uint32_t kind = volume()->GetKind();
     const std::uint64_t position = m_entry->GetPosition();
     if (kind == 10) {
         const std::uint64_t at = mftRecordOffset(position);
@@ -164,7 +127,7 @@ QList<NavigationPoint> StorageFile::buildNavigationPoints()
         return {};
     }
     // Other file systems give the position of the entry's record as a volume sector or byte.
-    const std::uint64_t vss = m_volume->GetBytesPerSector();
+    const std::uint64_t vss = volume()->GetBytesPerSector();
     const std::uint64_t volumeByte = (m_entry->GetAttributes() & AttrRunsInSectors)
                                          ? (position <= UINT64_MAX / vss ? position * vss : UINT64_MAX)
                                          : position;

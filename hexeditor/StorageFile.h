@@ -4,16 +4,15 @@
 
 #include <QMap>
 
-#include "Storage.h"
+#include "StorageVolumeBase.h"
 
 class cDevice;
 class cPartition;
 class CEntry;
-class CVolume;
 
 namespace HexEditor {
 
-class StorageFile : public Storage
+class StorageFile : public StorageVolumeBase
 {
     Q_OBJECT
 
@@ -23,7 +22,6 @@ public:
     explicit StorageFile(CEntry *entry, QObject *parent = nullptr);
 
     CEntry *entry() const { return m_entry; }
-    CVolume *volume() const { return m_volume; }
     int mode() const { return m_mode; }
     // Empties the cache, makes the device, the partition or the entry the kernel object and
     // rebuilds the navigation points. False for a mode without its object (then nothing changes).
@@ -36,30 +34,21 @@ public:
     const QMap<std::uint64_t, std::uint64_t> &extents() const { return m_extents; }
 
     bool isFileStorage() const override { return true; }
-    std::uint32_t fileSystemKind() const override;
-    std::uint32_t clusterSize() const override;
-    std::uint64_t mftRecordCount() const override;
-    std::uint64_t mftRecordOffset(std::uint64_t index) const override;
-    std::uint32_t mftRecordSize() const override { return m_mftRecordSize; }
-    std::uint64_t catalogNodeCount() const override;
-    std::uint64_t catalogNodeOffset(std::uint64_t index) const override;
-    std::uint32_t inodeSize() const override { return m_inodeSize; }
 
 protected:
     QList<NavigationPoint> buildNavigationPoints() override;
+    // The partition's first byte in disk mode, 0 in partition mode; no placement in file mode.
+    bool volumeBase(std::uint64_t &base) const override;
 
 private:
     cDevice *m_device = nullptr;
     cPartition *m_partition = nullptr;
-    CVolume *m_volume = nullptr;
     CEntry *m_entry = nullptr;
     int m_mode = DiskMode;
     std::uint64_t m_partitionFirstSector = 0;
     std::uint64_t m_startInPartition = ~0ull;
     QMap<std::uint64_t, std::uint64_t> m_extents;
     bool m_extentsInSectors = false;
-    std::uint32_t m_mftRecordSize = 0;
-    std::uint32_t m_inodeSize = 128;
 };
 
 } // namespace HexEditor

@@ -150,6 +150,11 @@ TEST(StorageImage, FileOfAVolumeInItsThreeModes)
 
     StorageFile file(&entry);
     EXPECT_EQ(file.mode(), StorageFile::DiskMode);
+    // No file system the storage knows: the record and inode sizes are the storages' defaults.
+    EXPECT_EQ(file.fileSystemKind(), 24u);
+    EXPECT_EQ(file.mftRecordSize(), 1024u);
+    EXPECT_EQ(file.inodeSize(), 128u);
+    EXPECT_EQ(file.mftRecordCount(), 0u);
     EXPECT_EQ(file.extents(), (QMap<std::uint64_t, std::uint64_t>{{8, 9}, {20, 23}}));
     const QByteArray disk = TestUtil::readFile(image);
     EXPECT_EQ(file.fileStartOffset(), 2048u * 512 + 4096);
@@ -274,6 +279,27 @@ TEST(StorageImage, NavigationOfAGptDiskAndAnNtfsVolume)
     if (CVolume *v = ntfsPartition->Volume(); v && v->GetKind() == 10) {
         StorageVolume volume(v);
         EXPECT_EQ(volume.mftRecordSize(), 1024u);
+
+        // A file of the volume answers the volume's file-system questions in every mode; its own
+        // data holds no records.
+        CEntry entry(v, nullptr, QStringLiteral("file.bin"), 0, 0);
+        entry.GetHandle().AddRun(4096, 4096);
+        entry.SetSize(4096);
+        StorageFile file(&entry);
+        ASSERT_EQ(file.mode(), StorageFile::DiskMode);
+        EXPECT_EQ(file.fileSystemKind(), 10u);
+        EXPECT_EQ(file.clusterSize(), volume.clusterSize());
+        EXPECT_EQ(file.clusterSize(), 4096u);
+        EXPECT_EQ(file.mftRecordSize(), 1024u);
+        EXPECT_EQ(file.mftRecordCount(), volume.mftRecordCount());
+        EXPECT_EQ(file.mftRecordOffset(0),
+                  volume.mftRecordOffset(0) ? 2048 * 512 + volume.mftRecordOffset(0) : 0);
+        ASSERT_TRUE(file.setMode(StorageFile::PartitionMode));
+        EXPECT_EQ(file.mftRecordOffset(0), volume.mftRecordOffset(0));
+        EXPECT_EQ(file.mftRecordSize(), 1024u);
+        ASSERT_TRUE(file.setMode(StorageFile::FileMode));
+        EXPECT_EQ(file.mftRecordOffset(0), 0u);
+        EXPECT_EQ(file.catalogNodeOffset(0), 0u);
     }
 }
 
