@@ -6,6 +6,7 @@
 #include "ClientFramework/DeviceChange/DeviceChangeHandler.h"
 #include "ClientFramework/NodeTree/NodeDevice.h"
 #include "ClientFramework/NodeTree/NodeRoot.h"
+#include "ClientFramework/Views/DiskBrowserView.h"
 #include "ClientFramework/Views/DiskExplorerView.h"
 #include "ClientFramework/Views/PropertyPane.h"
 #include "Kernel/Implementation/Platform/Linux/UdevMonitor.h"
@@ -107,6 +108,17 @@ void MainView::registerViews()
         connect(view, &Framework::DiskExplorerView::populationStarted, this,
                 [this](const QString &text) { showProgress(text); });
         connect(view, &Framework::DiskExplorerView::populationFinished, this, [this] { clearProgress(); });
+        return view;
+    });
+    windowManager()->setNodeNamer(
+        [](NodeCore *node) { return node ? node->text(NodeAttr::Name) : QString(); });
+    windowManager()->registerView(Framework::DiskBrowserView::ViewId, [this] {
+        auto *view = new Framework::DiskBrowserView(m_nodes.get(), commander());
+        connect(view, &Framework::DiskBrowserView::populationStarted, this,
+                [this](const QString &text) { showProgress(text); });
+        connect(view, &Framework::DiskBrowserView::populationFinished, this, [this] { clearProgress(); });
+        connect(windowManager(), &Framework::WindowManager::browseRequested, view,
+                &Framework::DiskBrowserView::browseTo);
         return view;
     });
     windowManager()->registerView(
@@ -222,9 +234,20 @@ void MainView::connectCommands()
     c->setHandler(QStringLiteral("cmdOpen_Explorer"),
                   [this] { windowManager()->openView(QStringLiteral("explorer")); });
     // "File Browser" waits for its view: until it is registered the command stays disabled.
-    if (windowManager()->isRegistered(QStringLiteral("browser")))
+    if (windowManager()->isRegistered(QStringLiteral("browser"))) {
         c->setHandler(QStringLiteral("cmdOpen_Browser"),
                       [this] { windowManager()->openView(QStringLiteral("browser")); });
+        // "Open in File Browser" shows the first selected node there; Ctrl+B works window-wide.
+        c->setHandler(QStringLiteral("cmdNode_Browse"), [this] {
+            const QList<NodeCore *> nodes = commander()->selection();
+            if (nodes.isEmpty() || !nodes.constFirst())
+                windowManager()->openView(QStringLiteral("browser"));
+            else
+                windowManager()->openInBrowser(nodes.constFirst());
+        });
+        if (QAction *browse = c->action(QStringLiteral("cmdNode_Browse")))
+            addAction(browse);
+    }
     c->setHandler(QStringLiteral("cmdProperties"),
                   [this] { windowManager()->openView(Framework::PropertyPane::ViewId); });
     if (m_kernel) {

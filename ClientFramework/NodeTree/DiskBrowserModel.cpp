@@ -5,7 +5,34 @@
 
 #include <QCoreApplication>
 #include <QDeadlineTimer>
+#include <QHash>
 #include <QThread>
+
+namespace {
+
+// The folders under population by any model of the process, with the model that populates each.
+// Two views over the same tree would otherwise run two workers on one folder at once, and both
+// would build that folder's pending children together. Touched on the interface thread only.
+QHash<const NodeCore *, const DiskBrowserModel *> &claims()
+{
+    static QHash<const NodeCore *, const DiskBrowserModel *> map;
+    return map;
+}
+
+bool claimedElsewhere(const NodeCore *node, const DiskBrowserModel *model)
+{
+    const auto it = claims().constFind(node);
+    return it != claims().constEnd() && it.value() != model;
+}
+
+void release(const NodeCore *node, const DiskBrowserModel *model)
+{
+    const auto it = claims().find(node);
+    if (it != claims().end() && it.value() == model)
+        claims().erase(it);
+}
+
+} // namespace
 
 DiskBrowserModel::DiskBrowserModel(NodeCore *root, QObject *parent) : NodeModel(root, parent)
 {
@@ -35,7 +62,8 @@ bool DiskBrowserModel::canFetchMore(const QModelIndex &parent) const
     if (parent.isValid() && parent.column() != 0)
         return false;
     const NodeCore *node = nodeOf(parent);
-    return node && node->canPopulate() && !node->isPopulated() && !isPopulating(node);
+    return node && node->canPopulate() && !node->isPopulated() && !isPopulating(node) &&
+           !claimedElsewhere(node, this);
 }
 
 bool DiskBrowserModel::isPopulating(const NodeCore *node) const
@@ -51,7 +79,8 @@ bool DiskBrowserModel::isPopulating(const NodeCore *node) const
 void DiskBrowserModel::fetchMore(const QModelIndex &parent)
 {
     NodeCore *node = nodeOf(parent);
-    if (!node || !node->canPopulate() || node->isPopulated() || isPopulating(node))
+    if (!node || !node->canPopulate() || node->isPopulated() || isPopulating(node) ||
+        claimedElsewhere(node, this))
         return;
     if (m_synchronous) {
         emit populationStarted(
@@ -60,6 +89,7 @@ void DiskBrowserModel::fetchMore(const QModelIndex &parent)
         emit populationFinished(node, false);
         return;
     }
+    claims().insert(node, this);
     m_queue.append(node);
     startQueued();
 }
@@ -77,6 +107,7 @@ void DiskBrowserModel::startWorker(NodeCore *node)
     connect(worker, &Threads::NodeTagged::populated, this, [this, worker](NodeCore *n, bool cancelled) {
         m_workers.removeOne(worker);
         worker->deleteLater();
+        release(n, this);
         emit populationFinished(n, cancelled);
         startQueued();
     });
@@ -87,6 +118,8 @@ void DiskBrowserModel::startWorker(NodeCore *node)
 
 void DiskBrowserModel::cancelAll()
 {
+    for (NodeCore *n : std::as_const(m_queue))
+        release(n, this);
     m_queue.clear();
     const QList<Threads::NodeTagged *> workers = m_workers;
     for (Threads::NodeTagged *w : workers)
@@ -96,6 +129,7 @@ void DiskBrowserModel::cancelAll()
     for (Threads::NodeTagged *w : workers)
         w->apply(); // a cancelled population leaves its folder unpopulated
     for (Threads::NodeTagged *w : workers) {
+        release(w->node(), this);
         m_workers.removeOne(w);
         w->deleteLater();
     }
@@ -127,8 +161,10 @@ void DiskBrowserModel::childrenAboutToBeRemoved(NodeCore *parent, int first, int
     for (int r = first; r <= last; ++r) {
         NodeCore *gone = parent->child(r);
         for (qsizetype i = m_queue.size() - 1; i >= 0; --i)
-            if (gone && gone->isAncestorOf(m_queue[i]))
+            if (gone && gone->isAncestorOf(m_queue[i])) {
+                release(m_queue[i], this);
                 m_queue.removeAt(i);
+            }
     }
     const QList<Threads::NodeTagged *> workers = m_workers;
     for (Threads::NodeTagged *w : workers) {
@@ -138,6 +174,7 @@ void DiskBrowserModel::childrenAboutToBeRemoved(NodeCore *parent, int first, int
                 w->abandon();
                 w->cancel();
                 w->wait();
+                release(w->node(), this);
                 m_workers.removeOne(w);
                 w->disconnect(this);
                 w->deleteLater();
