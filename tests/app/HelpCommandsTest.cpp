@@ -52,8 +52,9 @@ TEST(HelpDocument, GuideCoversTheTopicsAndItsContentsLinkIntoIt)
     for (auto it = link.globalMatch(contents); it.hasNext();) {
         const QUrl url(it.next().captured(1));
         EXPECT_EQ(url.adjusted(QUrl::RemoveFragment).toString(), Help::GuideUrl);
-        if (url.hasFragment())
+        if (url.hasFragment()) {
             EXPECT_TRUE(anchors.contains(url.fragment())) << url.toString().toStdString();
+        }
         ++links;
     }
     EXPECT_EQ(links, ids.size() + 1);
