@@ -46,24 +46,13 @@ public:
 
     bool ReadBytes(std::uint64_t offset, std::uint64_t length, void *buffer, std::uint32_t &error) override
     {
-        error = 0;
         auto *out = static_cast<std::uint8_t *>(buffer);
-        const std::uint64_t inside = offset >= m_size ? 0 : std::min(length, m_size - offset);
+        const std::uint64_t inside = insideLength(offset, length);
         std::memset(out + inside, 0, std::size_t(length - inside));
-        for (std::uint64_t done = 0; done < inside;) {
-            const std::uint32_t piece = std::uint32_t(std::min<std::uint64_t>(inside - done, 1u << 24));
-            if (!m_file->Read(offset + done, piece, out + done)) {
-                error = m_file->GetError() ? m_file->GetError() : SystemError::ReadFault;
-                return false;
-            }
-            done += piece;
-        }
-        // A range that runs past the end of the file is partly there, as with a device.
-        if (inside < length && (offset + length + SectorSize - 1) / SectorSize > GetTotalSectors()) {
-            error = SystemError::HandleEof;
-            return false;
-        }
-        return true;
+        return transfer(offset, length, SystemError::ReadFault, error,
+                        [&](std::uint64_t done, std::uint32_t piece) {
+                            return m_file->Read(offset + done, piece, out + done);
+                        });
     }
 
     bool WriteBytes(std::uint64_t offset, std::uint64_t length, const void *buffer,
@@ -81,11 +70,32 @@ public:
         }
         const auto *in = static_cast<const std::uint8_t *>(buffer);
         // The zeros after the end of the last partial sector are not part of the file.
-        const std::uint64_t inside = offset >= m_size ? 0 : std::min(length, m_size - offset);
+        return transfer(offset, length, SystemError::WriteFault, error,
+                        [&](std::uint64_t done, std::uint32_t piece) {
+                            return m_file->Write(offset + done, piece, in + done);
+                        });
+    }
+
+private:
+    // The bytes of a range that lie inside the file.
+    std::uint64_t insideLength(std::uint64_t offset, std::uint64_t length) const
+    {
+        return offset >= m_size ? 0 : std::min(length, m_size - offset);
+    }
+
+    // Moves the part of a range inside the file in pieces of at most 16 MiB through `step`
+    // (offset from the range's start, piece length). A range that runs past the file's last
+    // sector is partly there, as with a device, and fails after its part was moved.
+    template <typename Step>
+    bool transfer(std::uint64_t offset, std::uint64_t length, std::uint32_t fault, std::uint32_t &error,
+                  Step step)
+    {
+        error = 0;
+        const std::uint64_t inside = insideLength(offset, length);
         for (std::uint64_t done = 0; done < inside;) {
             const std::uint32_t piece = std::uint32_t(std::min<std::uint64_t>(inside - done, 1u << 24));
-            if (!m_file->Write(offset + done, piece, in + done)) {
-                error = m_file->GetError() ? m_file->GetError() : SystemError::WriteFault;
+            if (!step(done, piece)) {
+                error = m_file->GetError() ? m_file->GetError() : fault;
                 return false;
             }
             done += piece;
@@ -97,7 +107,6 @@ public:
         return true;
     }
 
-private:
     QString m_path;
     std::unique_ptr<CPlatformFile> m_file;
     cRoot *m_root = nullptr;

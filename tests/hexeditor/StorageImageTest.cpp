@@ -14,6 +14,7 @@
 #include "Kernel/Implementation/Images/ImageOpen.h"
 #include "Kernel/Implementation/Partition.h"
 #include "Kernel/Implementation/Root.h"
+#include "Kernel/Implementation/SystemError.h"
 #include "StorageTestMedium.h"
 #include "TestUtil.h"
 #include "hexeditor/StorageFactory.h"
@@ -111,6 +112,50 @@ TEST(StorageImage, PlainFileSaveChangesExactlyTheEditedBytes)
         TestUtil::run("sh", {"-c", QStringLiteral("printf 'HEAD' | cmp -n 4 - %1").arg(path)});
     EXPECT_EQ(cmp.exitCode, 0);
     EXPECT_FALSE(s->isModified());
+}
+
+TEST(StorageImage, PlainFileRangesPastTheEndReadZerosAndNeverLengthenTheFile)
+{
+    QTemporaryDir dir;
+    const QString path = dir.filePath("data.bin");
+    const QByteArray original = patternBytes(3 * 512 + 100, 5);
+    ASSERT_TRUE(TestUtil::writeFile(path, original));
+    CRoot root;
+    QString error;
+    std::unique_ptr<Storage> s = createPlainFileStorage(path, &root, error);
+    ASSERT_TRUE(s) << error.toStdString();
+    cStorage *object = s->kernelObject();
+    ASSERT_TRUE(object);
+    EXPECT_EQ(object->GetTotalSectors(), 4u);
+
+    // Inside the partial last sector: the file's bytes, then zeros.
+    QByteArray buffer(512, '\xEE');
+    std::uint32_t code = 1;
+    EXPECT_TRUE(object->ReadSectors(3, 1, buffer.data(), code));
+    EXPECT_EQ(code, 0u);
+    EXPECT_EQ(buffer.left(100), original.mid(3 * 512));
+    EXPECT_EQ(buffer.mid(100), QByteArray(412, '\0'));
+
+    // Past the last sector: what exists is read, the rest is zeros, and the end is reported.
+    QByteArray past(1024, '\xEE');
+    EXPECT_FALSE(object->ReadBytes(3 * 512 + 90, 1024, past.data(), code));
+    EXPECT_EQ(code, SystemError::HandleEof);
+    EXPECT_EQ(past.left(10), original.right(10));
+    EXPECT_EQ(past.mid(10), QByteArray(1014, '\0'));
+
+    // A write past the last sector writes what lies inside the file and reports the end.
+    const QByteArray bytes(600, 'W');
+    EXPECT_FALSE(object->WriteBytes(3 * 512 + 80, 600, bytes.constData(), code));
+    EXPECT_EQ(code, SystemError::HandleEof);
+    QByteArray expected = original;
+    expected.replace(3 * 512 + 80, 20, QByteArray(20, 'W'));
+    EXPECT_EQ(TestUtil::readFile(path), expected);
+
+    // A whole last sector writes the file's part only.
+    const QByteArray sector(512, 'S');
+    EXPECT_TRUE(object->WriteSectors(3, 1, sector.constData(), code));
+    expected.replace(3 * 512, 100, QByteArray(100, 'S'));
+    EXPECT_EQ(TestUtil::readFile(path), expected);
 }
 
 TEST(StorageImage, MissingPlainFileIsRefused)
