@@ -95,9 +95,9 @@ DiskBrowserView::DiskBrowserView(NodeCore *root, Core::Commander *commander, QWi
     m_list->setAlternatingRowColors(true);
     m_list->setContextMenuPolicy(Qt::CustomContextMenu);
     m_list->header()->setStretchLastSection(true);
-    m_list->setColumnWidth(0, 280);
-    m_list->setColumnWidth(1, 90);
-    m_list->setColumnWidth(2, 110);
+    m_list->setColumnWidth(0, 220);
+    m_list->setColumnWidth(1, 80);
+    m_list->setColumnWidth(2, 100);
 
     m_splitter->setObjectName(QStringLiteral("browserSplitter"));
     m_splitter->addWidget(m_tree);

@@ -746,3 +746,28 @@ TEST(DiskBrowser, TwoViewsPopulateOneFolderOnce)
     EXPECT_FALSE(docs->isPopulated());
     EXPECT_TRUE(b->model()->canFetchMore(b->model()->indexOf(docs)));
 }
+
+// A picture of the browser inside a folder, written when BRINDLE_SCREENSHOT_DIR names a folder.
+TEST(DiskBrowser, Screenshot)
+{
+    const QString out = qEnvironmentVariable("BRINDLE_SCREENSHOT_DIR");
+    if (out.isEmpty())
+        GTEST_SKIP() << "set BRINDLE_SCREENSHOT_DIR to write the picture";
+    FolderVolume volume;
+    Window w;
+    NodeDrive *drive = w.addDrive(volume);
+    w.commander.action("cmdOpen_Browser")->trigger();
+    Framework::DiskBrowserView *b = w.browser();
+    w.view.resize(1100, 700);
+    w.view.show();
+    ASSERT_TRUE(QTest::qWaitForWindowExposed(&w.view));
+    ASSERT_TRUE(b->browseTo(drive));
+    ASSERT_TRUE(waitListed(b, drive->rootFolder()));
+    NodeCore *docs = listedByName(b, "DOCS");
+    ASSERT_TRUE(b->openFolder(docs));
+    ASSERT_TRUE(waitListed(b, docs));
+    ASSERT_TRUE(b->openFolder(drive));
+    ASSERT_TRUE(b->browseTo(listedByName(b, "HELLO.TXT")));
+    QTest::qWait(200);
+    EXPECT_TRUE(w.view.grab().save(out + "/browser.png"));
+}
