@@ -84,9 +84,15 @@ int Application::exitCode() const
     const auto &log = ApplicationLog::instance();
     if (log.errorCount() > m_errorsAtStart)
         return 1;
-    if (log.warningCount() > m_warningsAtStart)
+    if (log.warningCount() - m_warningsAtStart > m_conditions)
         return 2;
     return 0;
+}
+
+void Application::logCondition(const QString &text)
+{
+    ++m_conditions;
+    ApplicationLog::instance().add(text, LogEntry::Warning);
 }
 
 } // namespace Framework

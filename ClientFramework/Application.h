@@ -37,7 +37,13 @@ public:
     void initializationCompleted();
 
     // 1 when an error was logged since the application was made, else 2 after a warning, else 0.
+    // Warnings about normal conditions (logCondition) do not count.
     int exitCode() const;
+
+    // Logs a warning about a normal condition of the machine, such as a disk this process may not
+    // open: it shows like any warning but leaves the run's exit status alone.
+    void logCondition(const QString &text);
+    int conditionCount() const { return m_conditions; }
 
     // What to do when the command-line work is done (0 nothing, 3 save the log and shut down).
     void setFinalAction(int action) { m_finalAction = action; }
@@ -54,6 +60,7 @@ private:
     QList<QPair<QString, IPersistenceXML *>> m_components;
     int m_errorsAtStart = 0;
     int m_warningsAtStart = 0;
+    int m_conditions = 0;
     int m_finalAction = 0;
 };
 

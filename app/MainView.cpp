@@ -2,6 +2,7 @@
 
 #include "Commander.h"
 #include "DeviceChangeSink.h"
+#include "NodeCommands.h"
 
 #include "ClientFramework/DeviceChange/DeviceChangeHandler.h"
 #include "ClientFramework/NodeTree/NodeDevice.h"
@@ -9,6 +10,7 @@
 #include "ClientFramework/Views/DiskBrowserView.h"
 #include "ClientFramework/Views/DiskExplorerView.h"
 #include "ClientFramework/Views/PropertyPane.h"
+#include "ClientFramework/Views/SmartPane.h"
 #include "Kernel/Implementation/Platform/Linux/UdevMonitor.h"
 #include "Kernel/Implementation/Root.h"
 
@@ -38,6 +40,19 @@ const QString HomePage = QStringLiteral("https://brindle.orvane.example/");
 const QString RequestPage = QStringLiteral("https://brindle.orvane.example/support/request");
 const QString HelpPage = QStringLiteral("https://brindle.orvane.example/help");
 } // namespace
+
+const QStringList MainView::ToolBar = {QStringLiteral("cmdDI_Mount"),
+                                       QStringLiteral("cmdRefresh"),
+                                       QStringLiteral("cmdUpdate"),
+                                       QString(),
+                                       QStringLiteral("cmdOpen_Explorer"),
+                                       QStringLiteral("cmdHex_File"),
+                                       QString(),
+                                       QStringLiteral("cmdProperties"),
+                                       QStringLiteral("cmdSmartInfo"),
+                                       QString(),
+                                       QStringLiteral("cmdNode_Stop"),
+                                       QStringLiteral("cmdNode_StopAll")};
 
 MainView::MainView(Commander *commander, QWidget *parent) : Framework::MainView(commander, parent)
 {
@@ -125,6 +140,16 @@ void MainView::registerViews()
         Framework::PropertyPane::ViewId,
         [this] {
             auto *pane = new Framework::PropertyPane;
+            pane->showNodes(commander()->selection());
+            connect(windowManager(), &Framework::WindowManager::selectionChanged, pane,
+                    [pane](INodeSource *, const QList<NodeCore *> &nodes) { pane->showNodes(nodes); });
+            return pane;
+        },
+        Framework::WindowManager::Placement::DockRight);
+    windowManager()->registerView(
+        Framework::SmartPane::ViewId,
+        [this] {
+            auto *pane = new Framework::SmartPane;
             pane->showNodes(commander()->selection());
             connect(windowManager(), &Framework::WindowManager::selectionChanged, pane,
                     [pane](INodeSource *, const QList<NodeCore *> &nodes) { pane->showNodes(nodes); });
@@ -254,6 +279,13 @@ void MainView::connectCommands()
         c->setHandler(QStringLiteral("cmdRefresh"), [this] { m_kernel->Refresh(); });
         c->setHandler(QStringLiteral("cmdRemove"), [this] { removeSelectedImages(); });
     }
+    m_nodeCommands = new NodeCommands(
+        c, windowManager(),
+        [this](NodeCore *node) {
+            if (m_sink)
+                m_sink->repopulate(node);
+        },
+        Framework::SmartPane::ViewId, this);
     c->setHandler(QStringLiteral("cmdWebHome"), [] { UserPrompts::current().openUrl(HomePage); });
     c->setHandler(QStringLiteral("cmdWebRequest"), [] { UserPrompts::current().openUrl(RequestPage); });
     c->setHandler(QStringLiteral("cmdWebHelp"), [] { UserPrompts::current().openUrl(HelpPage); });

@@ -19,6 +19,7 @@ namespace Solution {
 
 class Commander;
 class DeviceChangeSink;
+class NodeCommands;
 
 class MainView : public Framework::MainView
 {
@@ -48,6 +49,10 @@ public:
     void setKernel(CRoot *kernel);
     CRoot *kernel() const { return m_kernel; }
     NodeRoot *nodeRoot() const { return m_nodes.get(); }
+    // The handlers of the node commands (Reload, Stop, Select All, ...), made by build().
+    NodeCommands *nodeCommands() const { return m_nodeCommands; }
+    // The main toolbar's commands.
+    static const QStringList ToolBar;
     Framework::DeviceChange::Handler *deviceChange() const { return m_deviceChange.get(); }
     IBlockDeviceMonitor *blockMonitor() const { return m_monitor.get(); }
 
@@ -65,6 +70,7 @@ protected:
     QStringList defaultViews() const override;
     QString initialView() const override;
     bool restoresView(const QString &viewId) const override;
+    QStringList toolBarCommands() const override { return ToolBar; }
 
 private:
     bool welcomeAtStart() const;
@@ -77,6 +83,7 @@ private:
     std::unique_ptr<Framework::DeviceChange::Handler> m_deviceChange;
     std::unique_ptr<IBlockDeviceMonitor> m_monitor;
     QString m_notReadyTip;
+    NodeCommands *m_nodeCommands = nullptr;
 };
 
 } // namespace Solution

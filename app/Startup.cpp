@@ -3,6 +3,7 @@
 #include "CliArguments.h"
 #include "Commander.h"
 #include "KernelHost.h"
+#include "KernelRecords.h"
 #include "MainView.h"
 #include "ProcessingAction.h"
 #include "RequestHost.h"
@@ -13,7 +14,6 @@
 #include "ClientFramework/GenericError.h"
 #include "ClientFramework/HighDpi.h"
 #include "ClientFramework/Log/ApplicationLog.h"
-#include "ClientFramework/Log/KernelLog.h"
 #include "ClientFramework/QuitOnSignal.h"
 #include "ClientFramework/Settings/SettingsDocument.h"
 #include "ClientFramework/Views/RecentFiles.h"
@@ -122,9 +122,10 @@ int Startup::run(const QStringList &argumentList, int &argc, char **argv)
             arguments->save(root, true);
         }
 
-        // The disk kernel root: its records reach the log; devices are enumerated on request.
+        // The disk kernel root: its records reach the log (a disk this process may not open is
+        // a normal condition, not a failure of the run); devices are enumerated on request.
         root = std::make_unique<CRoot>();
-        Framework::KernelLog::connect(root.get());
+        KernelRecords::connect(root.get(), application.get());
 
         commander = std::make_unique<Solution::Commander>();
         mainView = std::make_unique<MainView>(commander.get());

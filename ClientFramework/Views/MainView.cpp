@@ -18,8 +18,10 @@
 #include <QLabel>
 #include <QMenuBar>
 #include <QProgressBar>
+#include <QScreen>
 #include <QStatusBar>
 #include <QTimer>
+#include <QToolBar>
 
 namespace Framework {
 
@@ -79,6 +81,7 @@ void MainView::build()
 {
     registerViews();
     buildMenus();
+    buildToolBars();
     connectCommands();
     for (IFeatureCommander *f : m_commander->features())
         f->registerViews(*m_windows);
@@ -153,6 +156,34 @@ void MainView::connectCommands()
     });
     connect(m_windows, &WindowManager::selectionChanged, m_commander,
             [this](INodeSource *, const QList<NodeCore *> &nodes) { m_commander->setSelection(nodes); });
+}
+
+void MainView::buildToolBars()
+{
+    if (!m_toolBar) {
+        m_toolBar = addToolBar(tr("Main Toolbar"));
+        // The name keys the toolbar in the saved window state.
+        m_toolBar->setObjectName(QStringLiteral("mainToolBar"));
+        m_toolBar->setToolButtonStyle(Qt::ToolButtonTextBesideIcon);
+        m_toolBar->setIconSize(QSize(24, 24));
+    }
+    m_toolBar->clear();
+    bool separatorDue = false;
+    for (const QString &id : toolBarCommands()) {
+        if (id.isEmpty()) {
+            separatorDue = true;
+            continue;
+        }
+        QAction *a = m_commander->action(id);
+        if (!a)
+            continue;
+        if (separatorDue && !m_toolBar->actions().isEmpty() &&
+            !m_toolBar->actions().constLast()->isSeparator())
+            m_toolBar->addSeparator();
+        separatorDue = false;
+        m_toolBar->addAction(a);
+    }
+    m_toolBar->setVisible(!m_toolBar->actions().isEmpty());
 }
 
 void MainView::updateWindowsMenu()
@@ -271,8 +302,11 @@ void MainView::load(const QDomElement &element)
         m_windows->openView(id);
     const QByteArray geometry =
         QByteArray::fromBase64(element.attribute(QStringLiteral("geometry")).toLatin1());
-    if (!geometry.isEmpty())
-        restoreGeometry(geometry);
+    if (geometry.isEmpty() || !restoreGeometry(geometry)) {
+        QScreen *where = screen() ? screen() : QGuiApplication::primaryScreen();
+        if (where)
+            setGeometry(firstStartGeometry(where->availableGeometry()));
+    }
     const QByteArray state = QByteArray::fromBase64(element.attribute(QStringLiteral("state")).toLatin1());
     if (!state.isEmpty())
         restoreState(state);
@@ -286,6 +320,17 @@ void MainView::load(const QDomElement &element)
     if (!first.isEmpty())
         m_windows->openView(first);
     m_loaded = true;
+}
+
+QRect MainView::firstStartGeometry(const QRect &available)
+{
+    if (!available.isValid())
+        return QRect(0, 0, 1024, 720);
+    const QSize size(qMax(1, int(available.width() * FirstStartShare)),
+                     qMax(1, int(available.height() * FirstStartShare)));
+    QRect r(QPoint(0, 0), size);
+    r.moveCenter(available.center());
+    return r;
 }
 
 void MainView::saveWindowState()

@@ -13,6 +13,7 @@ class QLabel;
 class QMenu;
 class QProgressBar;
 class QTimer;
+class QToolBar;
 
 namespace Core {
 class Commander;
@@ -43,6 +44,8 @@ public:
     // The top-level menu of a title ("&File", ...), or nullptr.
     QMenu *menu(const QString &title) const;
     QMenu *recentMenu() const { return m_recentMenu; }
+    // The main toolbar ("mainToolBar"), built from the registry by build().
+    QToolBar *mainToolBar() const { return m_toolBar; }
 
     // Registers the views, builds the menus and connects the commands. The views are opened by
     // load() (the settings' visible views, or the defaults).
@@ -59,8 +62,14 @@ public:
 
     // Saves the geometry, the dock state and the view list with each view's element and "visible".
     void save(QDomElement &element, bool flush = false) override;
-    // Opens the views marked visible (or the defaults), then restores geometry and dock state.
+    // Opens the views marked visible (or the defaults), then restores geometry and dock state; with
+    // no geometry saved yet the window takes a share of the screen.
     void load(const QDomElement &element) override;
+
+    // The window's share of the screen's available area on first start, centred.
+    static constexpr double FirstStartShare = 0.8;
+    // The geometry of a first start within a screen's available area.
+    static QRect firstStartGeometry(const QRect &available);
 
 signals:
     // A file of "Recent Disk &Images" was chosen.
@@ -71,6 +80,9 @@ protected:
     QMenu *addCommandMenu(const QString &title, const QStringList &ids);
     virtual void registerViews();
     virtual void buildMenus();
+    // The commands of the main toolbar in order ("" is a separator; ids without a command are skipped).
+    virtual QStringList toolBarCommands() const { return {}; }
+    void buildToolBars();
     virtual void connectCommands();
     // The views opened when the settings name none.
     virtual QStringList defaultViews() const;
@@ -99,6 +111,7 @@ private:
     QMenu *m_windowsMenu = nullptr;
     QMenu *m_recentMenu = nullptr;
     QMenu *m_viewMenus[3] = {nullptr, nullptr, nullptr};
+    QToolBar *m_toolBar = nullptr;
     QTimer *m_stateTimer;
     QLabel *m_progressText;
     QProgressBar *m_progress;
