@@ -67,7 +67,7 @@ NodeCore *listedFolder(NodeCore *n)
 } // namespace
 
 DiskBrowserView::DiskBrowserView(NodeCore *root, Core::Commander *commander, QWidget *parent)
-    : GenericView(ViewId, tr("File Browser"), parent), m_root(root), m_commander(commander),
+    : GenericView(ViewId, tr("File Browser"), parent), m_commander(commander),
       m_model(new DiskBrowserModel(root, this)), m_filter(new NodeSortFilterModel(this)),
       m_folders(new FolderFilter(this)), m_tree(new QTreeView), m_list(new QTreeView),
       m_splitter(new QSplitter(Qt::Horizontal)), m_location(new QLabel), m_up(new QAction(tr("Up"), this))
@@ -232,7 +232,7 @@ NodeCore *DiskBrowserView::listNodeAt(const QModelIndex &filterIndex) const
 
 QModelIndex DiskBrowserView::filterIndexOf(const NodeCore *node) const
 {
-    if (!node || node == m_root)
+    if (!node || node == m_model->rootNode())
         return {};
     return m_filter->mapFromSource(m_model->indexOf(node));
 }
@@ -320,7 +320,11 @@ void DiskBrowserView::onListActivated(const QModelIndex &index)
 void DiskBrowserView::updateLocation()
 {
     const NodeCore *folder = currentFolder();
-    const QString text = folder ? folder->text(NodeAttr::Location) : m_model->title();
+    // The tree may be gone already (the model lets go of its root first).
+    const NodeCore *root = m_model->rootNode();
+    const QString text = folder ? folder->text(NodeAttr::Location)
+                         : root ? root->text(NodeAttr::Name)
+                                : QString();
     m_location->setText(text);
     m_location->setToolTip(text);
     m_up->setEnabled(treeNode() != nullptr);
@@ -351,7 +355,7 @@ bool DiskBrowserView::goUp()
     // The root folder and its volume show the same list: step over the volume.
     if (auto *drive = dynamic_cast<NodeDrive *>(p); drive && drive->rootFolder() == n)
         p = p->parent();
-    for (; p && p != m_root; p = p->parent())
+    for (; p && p != m_model->rootNode(); p = p->parent())
         if (openFolder(p))
             return true;
     return false;
@@ -359,7 +363,7 @@ bool DiskBrowserView::goUp()
 
 bool DiskBrowserView::browseTo(NodeCore *node)
 {
-    if (!node || node == m_root)
+    if (!node || node == m_model->rootNode())
         return false;
     NodeCore *file = node->kind() == NodeKind::File ? node : nullptr;
     NodeCore *folder = file ? file->parent() : node;
@@ -443,6 +447,11 @@ QList<QAction *> DiskBrowserView::widgetActions(Menu menu) const
     if (menu == ViewMenu) {
         QList<QAction *> list{m_up, nullptr};
         return list + m_filterActions;
+    }
+    if (menu == EditMenu && m_commander) {
+        if (QAction *a = m_commander->action(QStringLiteral("cmdNode_SelectAll")))
+            return {a};
+        return {};
     }
     if (menu == ActionsMenu && m_commander) {
         QList<QAction *> list;

@@ -92,7 +92,6 @@ private:
     void updateLocation();
     void announceSelection();
 
-    NodeCore *m_root;
     Core::Commander *m_commander;
     DiskBrowserModel *m_model;
     NodeSortFilterModel *m_filter;

@@ -36,6 +36,7 @@
 #include <QDomDocument>
 #include <QLabel>
 #include <QMenu>
+#include <QPointer>
 #include <QSignalSpy>
 #include <QSortFilterProxyModel>
 #include <QTest>
@@ -327,6 +328,10 @@ TEST(DiskBrowser, OpensThroughItsCommandsOnce)
     ASSERT_NE(browser, nullptr);
     EXPECT_EQ(browser->title(), "File Browser");
     EXPECT_EQ(w.windows()->activeView(), browser);
+    // Nothing chosen yet: the list shows the top level.
+    EXPECT_EQ(browser->currentFolder(), nullptr);
+    EXPECT_EQ(browser->locationLabel()->text(), w.view.nodeRoot()->text(NodeAttr::Name));
+    EXPECT_TRUE(listed(browser).contains(w.view.nodeRoot()->computer()));
     // Its filter switches and "Up" fill the "&View" menu while it is the active view.
     QStringList viewMenu;
     for (QAction *a : w.view.menu("&View")->actions())
@@ -334,6 +339,10 @@ TEST(DiskBrowser, OpensThroughItsCommandsOnce)
     EXPECT_TRUE(viewMenu.contains("browserUp"));
     EXPECT_TRUE(viewMenu.contains("bmfPartitions"));
     EXPECT_TRUE(viewMenu.contains("bmfSysEntries"));
+    QStringList editMenu;
+    for (QAction *a : w.view.menu("&Edit")->actions())
+        editMenu << a->objectName();
+    EXPECT_EQ(editMenu, QStringList({"cmdNode_SelectAll"}));
     // A second request activates the same view.
     w.windows()->openView("explorer");
     open->trigger();
@@ -745,6 +754,19 @@ TEST(DiskBrowser, TwoViewsPopulateOneFolderOnce)
     explorer->model()->cancelAll();
     EXPECT_FALSE(docs->isPopulated());
     EXPECT_TRUE(b->model()->canFetchMore(b->model()->indexOf(docs)));
+
+    // The browser closed while it populates a folder: the worker stops, the folder is free again.
+    ASSERT_TRUE(b->openFolder(docs));
+    ASSERT_TRUE(b->model()->isPopulating(docs));
+    EXPECT_FALSE(explorer->model()->canFetchMore(explorer->model()->indexOf(docs)));
+    QPointer<Framework::DiskBrowserView> closing(b);
+    ASSERT_TRUE(w.windows()->closeView("browser"));
+    QCoreApplication::sendPostedEvents(nullptr, QEvent::DeferredDelete);
+    ASSERT_TRUE(closing.isNull());
+    QApplication::processEvents();
+    if (!docs->isPopulated()) {
+        EXPECT_TRUE(explorer->model()->canFetchMore(explorer->model()->indexOf(docs)));
+    }
 }
 
 // A picture of the browser inside a folder, written when BRINDLE_SCREENSHOT_DIR names a folder.
@@ -770,4 +792,25 @@ TEST(DiskBrowser, Screenshot)
     ASSERT_TRUE(b->browseTo(listedByName(b, "HELLO.TXT")));
     QTest::qWait(200);
     EXPECT_TRUE(w.view.grab().save(out + "/browser.png"));
+}
+
+TEST(DiskBrowser, OutlivesTheTreeItShows)
+{
+    FolderVolume volume;
+    CRoot kernel;
+    auto nodes = std::make_unique<NodeRoot>(&kernel);
+    auto *drive = new NodeDrive(&volume);
+    nodes->computer()->appendChild(drive);
+    Framework::DiskBrowserView view(nodes.get(), nullptr);
+    ASSERT_TRUE(view.browseTo(drive));
+    view.model()->waitForPopulations();
+    QApplication::processEvents();
+    ASSERT_FALSE(listed(&view).isEmpty());
+    // A view still standing (closed, its deletion pending) when the tree goes.
+    nodes.reset();
+    EXPECT_EQ(view.currentFolder(), nullptr);
+    EXPECT_TRUE(view.selectedNodes().isEmpty());
+    EXPECT_TRUE(view.locationLabel()->text().isEmpty());
+    EXPECT_FALSE(view.goUp());
+    EXPECT_FALSE(view.browseTo(nullptr));
 }
