@@ -4,14 +4,39 @@
 
 namespace HexEditor {
 
+void SectorCache::pushNewest(Slot &slot)
+{
+    slot.older = m_newest;
+    slot.newer = nullptr;
+    if (m_newest)
+        m_newest->newer = &slot;
+    m_newest = &slot;
+    if (!m_oldest)
+        m_oldest = &slot;
+    slot.inOrder = true;
+    ++m_orderCount;
+}
+
+void SectorCache::unlink(Slot &slot)
+{
+    (slot.newer ? slot.newer->older : m_newest) = slot.older;
+    (slot.older ? slot.older->newer : m_oldest) = slot.newer;
+    slot.newer = slot.older = nullptr;
+    slot.inOrder = false;
+    --m_orderCount;
+}
+
 CachedSector *SectorCache::find(std::uint64_t n)
 {
     auto it = m_map.find(n);
     if (it == m_map.end())
         return nullptr;
-    if (it->second.inOrder)
-        m_order.splice(m_order.begin(), m_order, it->second.use);
-    return &it->second.sector;
+    Slot &slot = it->second;
+    if (slot.inOrder && m_newest != &slot) {
+        unlink(slot);
+        pushNewest(slot);
+    }
+    return &slot.sector;
 }
 
 const CachedSector *SectorCache::peek(std::uint64_t n) const
@@ -24,14 +49,13 @@ CachedSector *SectorCache::insert(CachedSector &&sector)
 {
     const std::uint64_t n = sector.number;
     remove(n);
-    Slot &slot = m_map[n];
+    Slot &slot = m_map.try_emplace(n).first->second;
     slot.sector = std::move(sector);
-    m_bytes += std::uint64_t(slot.sector.data.size());
+    const std::uint64_t size = std::uint64_t(slot.sector.data.size());
+    m_bytes += size;
     if (!pinned(slot.sector)) {
-        m_order.push_front(n);
-        slot.use = m_order.begin();
-        slot.inOrder = true;
-        m_evictableBytes += std::uint64_t(slot.sector.data.size());
+        pushNewest(slot);
+        m_evictableBytes += size;
     } else {
         m_pinned.insert(n);
     }
@@ -45,10 +69,11 @@ void SectorCache::remove(std::uint64_t n)
     auto it = m_map.find(n);
     if (it == m_map.end())
         return;
-    const std::uint64_t size = std::uint64_t(it->second.sector.data.size());
+    Slot &slot = it->second;
+    const std::uint64_t size = std::uint64_t(slot.sector.data.size());
     m_bytes -= size;
-    if (it->second.inOrder) {
-        m_order.erase(it->second.use);
+    if (slot.inOrder) {
+        unlink(slot);
         m_evictableBytes -= size;
     } else {
         m_pinned.erase(n);
@@ -59,7 +84,8 @@ void SectorCache::remove(std::uint64_t n)
 void SectorCache::clear()
 {
     m_map.clear();
-    m_order.clear();
+    m_newest = m_oldest = nullptr;
+    m_orderCount = 0;
     m_pinned.clear();
     m_bytes = 0;
     m_evictableBytes = 0;
@@ -74,14 +100,11 @@ void SectorCache::refresh(std::uint64_t n)
     const std::uint64_t size = std::uint64_t(slot.sector.data.size());
     const bool pin = pinned(slot.sector);
     if (pin && slot.inOrder) {
-        m_order.erase(slot.use);
-        slot.inOrder = false;
+        unlink(slot);
         m_evictableBytes -= size;
         m_pinned.insert(n);
     } else if (!pin && !slot.inOrder) {
-        m_order.push_front(n);
-        slot.use = m_order.begin();
-        slot.inOrder = true;
+        pushNewest(slot);
         m_evictableBytes += size;
         m_pinned.erase(n);
         trim();
@@ -90,10 +113,23 @@ void SectorCache::refresh(std::uint64_t n)
 
 void SectorCache::trim()
 {
-    while (m_evictableBytes > m_bound && m_order.size() > 1) {
-        const std::uint64_t victim = m_order.back();
-        remove(victim);
+    while (m_evictableBytes > m_bound && m_orderCount > 1) {
+        QByteArray data = m_oldest->sector.data;
+        remove(m_oldest->sector.number);
+        // The buffer serves the next read when nobody else holds it.
+        if (m_spare.isNull() && data.isDetached())
+            m_spare = std::move(data);
     }
+}
+
+QByteArray SectorCache::buffer(qsizetype size)
+{
+    QByteArray b = std::move(m_spare);
+    m_spare = QByteArray();
+    if (b.size() != size || !b.isDetached())
+        return QByteArray(size, '\0');
+    b.fill('\0');
+    return b;
 }
 
 std::vector<std::uint64_t> SectorCache::modifiedSectors() const

@@ -125,8 +125,7 @@ QString Storage::writeFailureText(std::uint64_t n, std::uint32_t error) const
 
 bool Storage::readFromKernel(std::uint64_t n, QByteArray &out, std::uint32_t &error)
 {
-    const std::uint32_t ss = sectorSize();
-    out = QByteArray(qsizetype(ss), '\0');
+    out = m_cache->buffer(qsizetype(sectorSize()));
     error = 0;
     if (m_active->ReadSectors(n, 1, out.data(), error))
         return true;
@@ -140,13 +139,17 @@ const CachedSector *Storage::sector(std::uint64_t n)
 {
     if (!m_active || !sectorSize() || n >= sectorCount())
         return nullptr;
+    return load(n);
+}
+
+const CachedSector *Storage::load(std::uint64_t n)
+{
     if (CachedSector *s = m_cache->find(n))
         return s;
     CachedSector fresh;
     fresh.number = n;
     std::uint32_t error = 0;
     fresh.readOk = readFromKernel(n, fresh.data, error);
-    fresh.modified = QBitArray(fresh.data.size());
     CachedSector *s = m_cache->insert(std::move(fresh));
     if (!s->readOk)
         emit readFailed(readFailureText(n, error));
@@ -162,6 +165,7 @@ ReadResult Storage::readDetailed(const DiskArea &area, bool cache)
         return result;
     std::uint64_t left = std::min({area.length, MaxTransfer, total - area.offset});
     std::uint64_t offset = area.offset;
+    const std::uint64_t sectors = sectorCount();
     result.firstSector = offset / ss;
     result.bytes.reserve(qsizetype(left));
     result.modified.resize(qsizetype(left));
@@ -172,15 +176,16 @@ ReadResult Storage::readDetailed(const DiskArea &area, bool cache)
         const std::uint32_t count = std::uint32_t(std::min<std::uint64_t>(ss - start, left));
         const CachedSector *s = nullptr;
         CachedSector temp;
-        if (cache) {
-            s = sector(n);
+        if (n >= sectors) {
+            s = nullptr;
+        } else if (cache) {
+            s = load(n);
         } else {
             s = m_cache->peek(n);
-            if (!s && n < sectorCount()) {
+            if (!s) {
                 std::uint32_t error = 0;
                 temp.number = n;
                 temp.readOk = readFromKernel(n, temp.data, error);
-                temp.modified = QBitArray(temp.data.size());
                 s = &temp;
             }
         }
@@ -189,9 +194,11 @@ ReadResult Storage::readDetailed(const DiskArea &area, bool cache)
             result.sectorOk.append(false);
         } else {
             result.bytes.append(s->data.constData() + start, qsizetype(count));
-            for (std::uint32_t i = 0; i < count; ++i)
-                if (s->modified.testBit(qsizetype(start + i)))
-                    result.modified.setBit(at + qsizetype(i));
+            if (!s->modified.isEmpty()) {
+                for (std::uint32_t i = 0; i < count; ++i)
+                    if (s->modified.testBit(qsizetype(start + i)))
+                        result.modified.setBit(at + qsizetype(i));
+            }
             result.sectorOk.append(s->readOk);
         }
         at += qsizetype(count);
@@ -244,7 +251,7 @@ std::uint64_t Storage::write(std::uint64_t offset, const QByteArray &bytes, bool
                 break;
             CachedSector *s = m_cache->find(n);
             std::memcpy(s->data.data() + start, bytes.constData() + done, count);
-            s->modified.fill(true, qsizetype(start), qsizetype(start + count));
+            s->mark(qsizetype(start), qsizetype(start + count), true);
             m_cache->refresh(n);
         } else {
             QByteArray data;
@@ -290,7 +297,7 @@ void Storage::setModified(const DiskArea &area, bool flag)
         // Clearing marks of a sector not cached changes nothing: don't read it for that.
         if (flag ? sector(n) != nullptr : m_cache->peek(n) != nullptr) {
             CachedSector *s = m_cache->find(n);
-            s->modified.fill(flag, qsizetype(start), qsizetype(start + count));
+            s->mark(qsizetype(start), qsizetype(start + count), flag);
             m_cache->refresh(n);
         }
         offset += count;
@@ -316,7 +323,7 @@ bool Storage::isModified(const DiskArea &area) const
         const std::uint64_t from = std::max(area.offset, sec.offset) - sec.offset;
         const std::uint64_t to = std::min(area.end(), sec.end()) - sec.offset;
         for (std::uint64_t i = from; i < to; ++i)
-            if (s->modified.testBit(qsizetype(i)))
+            if (s->isMarked(qsizetype(i)))
                 return true;
     }
     return false;
@@ -375,7 +382,7 @@ QList<SaveFailure> Storage::save()
         CachedSector *s = m_cache->find(n);
         std::uint32_t error = 0;
         if (m_active->WriteSectors(n, 1, s->data.constData(), error)) {
-            s->modified.fill(false);
+            s->modified.clear();
             // A sector that could not be read was zeros plus edits; it is readable data now.
             s->readOk = true;
             m_cache->refresh(n);

@@ -32,8 +32,19 @@ struct CachedSector
     std::uint64_t number = 0;
     bool readOk = true;
     QByteArray data;    // exactly one sector; zeros when the read failed
-    QBitArray modified; // one bit per byte of data
-    bool isModified() const { return modified.count(true) != 0; }
+    QBitArray modified; // one bit per byte of data once a byte was marked; empty before
+    bool isModified() const { return !modified.isEmpty() && modified.count(true) != 0; }
+    bool isMarked(qsizetype i) const { return !modified.isEmpty() && modified.testBit(i); }
+    // Sets or clears the marks of bytes [from, to).
+    void mark(qsizetype from, qsizetype to, bool flag)
+    {
+        if (modified.isEmpty()) {
+            if (!flag)
+                return;
+            modified = QBitArray(data.size());
+        }
+        modified.fill(flag, from, to);
+    }
 };
 
 // What a range read gives: the bytes, one modified mark per byte, and for every sector the range
@@ -177,6 +188,8 @@ protected:
 private:
     // Reads sector n from the kernel into `out` (zeros and false on failure, with the message).
     bool readFromKernel(std::uint64_t n, QByteArray &out, std::uint32_t &error);
+    // sector() for a number already checked against the sector count.
+    const CachedSector *load(std::uint64_t n);
     QString readFailureText(std::uint64_t n, std::uint32_t error) const;
     QString writeFailureText(std::uint64_t n, std::uint32_t error) const;
 
