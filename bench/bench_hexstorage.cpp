@@ -41,14 +41,16 @@ void page(HexEditor::Storage &s, std::uint64_t from, std::uint64_t to, std::uint
         bytes += std::uint64_t(s.read(HexEditor::DiskArea{off, Page}).size());
 }
 
-void BM_StoragePaging(benchmark::State &state)
+// Makes a sparse image of `size` bytes, then in every iteration opens it as a plain-file storage
+// and hands it to `walk`, which pages through it and counts the bytes read; reports the cache's
+// size after paging and the peak RSS.
+template <typename Walk>
+void pageImage(benchmark::State &state, std::uint64_t size, const char *makeError, Walk walk)
 {
-    const char *sizeText = std::getenv("BRINDLE_BENCH_BYTES");
-    const std::uint64_t size = sizeText ? std::strtoull(sizeText, nullptr, 10) : (4ull << 30);
     QTemporaryDir dir;
     const QString path = sparseFile(dir, size);
     if (path.isEmpty()) {
-        state.SkipWithError("cannot make the sparse image");
+        state.SkipWithError(makeError);
         return;
     }
     CRoot root;
@@ -60,38 +62,30 @@ void BM_StoragePaging(benchmark::State &state)
             state.SkipWithError("cannot open the image");
             return;
         }
-        page(*s, 0, s->size(), bytes);
+        walk(*s, bytes);
         state.counters["cache_MiB"] = double(s->cachedBytes()) / (1 << 20);
     }
     state.SetBytesProcessed(std::int64_t(bytes));
     state.counters["peak_rss_MiB"] = peakRssMiB();
+}
+
+void BM_StoragePaging(benchmark::State &state)
+{
+    const char *sizeText = std::getenv("BRINDLE_BENCH_BYTES");
+    const std::uint64_t size = sizeText ? std::strtoull(sizeText, nullptr, 10) : (4ull << 30);
+    pageImage(state, size, "cannot make the sparse image",
+              [](HexEditor::Storage &s, std::uint64_t &bytes) { page(s, 0, s.size(), bytes); });
 }
 BENCHMARK(BM_StoragePaging)->Unit(benchmark::kMillisecond)->Iterations(1);
 
 void BM_StorageHugeSparseImage(benchmark::State &state)
 {
     const std::uint64_t size = 2000ull * 1000 * 1000 * 1000; // 2 TB
-    QTemporaryDir dir;
-    const QString path = sparseFile(dir, size);
-    if (path.isEmpty()) {
-        state.SkipWithError("cannot make the 2 TB sparse image (file system limit?)");
-        return;
-    }
-    CRoot root;
-    QString error;
-    std::uint64_t bytes = 0;
-    for (auto _ : state) {
-        std::unique_ptr<HexEditor::Storage> s = HexEditor::createPlainFileStorage(path, &root, error);
-        if (!s) {
-            state.SkipWithError("cannot open the image");
-            return;
-        }
-        page(*s, 0, 256ull << 20, bytes);
-        page(*s, s->size() - (256ull << 20), s->size(), bytes);
-        state.counters["cache_MiB"] = double(s->cachedBytes()) / (1 << 20);
-    }
-    state.SetBytesProcessed(std::int64_t(bytes));
-    state.counters["peak_rss_MiB"] = peakRssMiB();
+    pageImage(state, size, "cannot make the 2 TB sparse image (file system limit?)",
+              [](HexEditor::Storage &s, std::uint64_t &bytes) {
+                  page(s, 0, 256ull << 20, bytes);
+                  page(s, s.size() - (256ull << 20), s.size(), bytes);
+              });
 }
 BENCHMARK(BM_StorageHugeSparseImage)->Unit(benchmark::kMillisecond)->Iterations(1);
 
