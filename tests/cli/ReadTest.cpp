@@ -9,28 +9,6 @@
 
 namespace {
 
-class LoopGuard
-{
-public:
-    explicit LoopGuard(const QString &image)
-    {
-        auto r = TestUtil::run("losetup", {"-f", "--show", image});
-        if (r.exitCode == 0)
-            m_path = QString::fromUtf8(r.out).trimmed();
-    }
-    ~LoopGuard()
-    {
-        if (!m_path.isEmpty())
-            TestUtil::run("losetup", {"-d", m_path});
-    }
-    LoopGuard(const LoopGuard &) = delete;
-    LoopGuard &operator=(const LoopGuard &) = delete;
-    const QString &path() const { return m_path; }
-
-private:
-    QString m_path;
-};
-
 QByteArray ddRead(const QString &path, qint64 offset, qint64 length)
 {
     auto r = TestUtil::run("dd", {"if=" + path, "bs=1", "skip=" + QString::number(offset),
@@ -59,22 +37,22 @@ TEST(CliRead, BytesEqualDdAtAnyOffset)
         c = char(rng());
     data[510] = data[511] = 0;
     ASSERT_TRUE(TestUtil::writeFile(image, data));
-    LoopGuard loop(image);
-    ASSERT_FALSE(loop.path().isEmpty());
+    TestUtil::LoopDevice loop(image);
+    ASSERT_FALSE(loop.Device().isEmpty());
     const QString cli = TestUtil::builtProgram("brindle-cli");
 
     const qint64 size = data.size();
     const QList<QPair<qint64, qint64>> ranges = {{0, 512},     {510, 10},       {1, 1},
                                                  {4095, 4098}, {100000, 70000}, {size - 600, 600}};
     for (const auto &r : ranges) {
-        auto out = TestUtil::run(cli, {"read", loop.path(), "--offset", QString::number(r.first), "--length",
-                                       QString::number(r.second), "--raw"});
+        auto out = TestUtil::run(cli, {"read", loop.Device(), "--offset", QString::number(r.first),
+                                       "--length", QString::number(r.second), "--raw"});
         EXPECT_EQ(out.exitCode, 0) << out.err.toStdString();
-        EXPECT_EQ(out.out, ddRead(loop.path(), r.first, r.second)) << r.first << "+" << r.second;
+        EXPECT_EQ(out.out, ddRead(loop.Device(), r.first, r.second)) << r.first << "+" << r.second;
     }
 
     // Hex form: offset, sixteen bytes, character column.
-    auto hex = TestUtil::run(cli, {"read", loop.path(), "--offset", "0x1F8", "--length", "20"});
+    auto hex = TestUtil::run(cli, {"read", loop.Device(), "--offset", "0x1F8", "--length", "20"});
     ASSERT_EQ(hex.exitCode, 0);
     const QStringList lines = QString::fromLatin1(hex.out).split('\n', Qt::SkipEmptyParts);
     ASSERT_EQ(lines.size(), 2);
@@ -85,12 +63,12 @@ TEST(CliRead, BytesEqualDdAtAnyOffset)
 
     // Past the end: the bytes that exist, then an error.
     auto past = TestUtil::run(
-        cli, {"read", loop.path(), "--offset", QString::number(size - 100), "--length", "300", "--raw"});
+        cli, {"read", loop.Device(), "--offset", QString::number(size - 100), "--length", "300", "--raw"});
     EXPECT_EQ(past.exitCode, 1);
     EXPECT_EQ(past.out, data.right(100));
     EXPECT_FALSE(past.err.isEmpty());
     auto beyond =
-        TestUtil::run(cli, {"read", loop.path(), "--offset", QString::number(size + 5), "--length", "3"});
+        TestUtil::run(cli, {"read", loop.Device(), "--offset", QString::number(size + 5), "--length", "3"});
     EXPECT_EQ(beyond.exitCode, 1);
     EXPECT_TRUE(beyond.out.isEmpty());
 }
