@@ -6,6 +6,8 @@
 #include <QCoreApplication>
 #include <QDeadlineTimer>
 #include <QHash>
+#include <QPersistentModelIndex>
+#include <QPointer>
 #include <QThread>
 
 namespace {
@@ -25,11 +27,43 @@ bool claimedElsewhere(const NodeCore *node, const DiskBrowserModel *model)
     return it != claims().constEnd() && it.value() != model;
 }
 
-void release(const NodeCore *node, const DiskBrowserModel *model)
+// Models that asked for a folder while another model populated it. When that population ends
+// without a result (cancelled), they start their own. The node is only a key here: a removed row
+// leaves its index invalid, and the entry is dropped.
+struct Waiter
+{
+    QPointer<DiskBrowserModel> model;
+    QPersistentModelIndex index;
+};
+
+QMultiHash<const NodeCore *, Waiter> &waiters()
+{
+    static QMultiHash<const NodeCore *, Waiter> map;
+    return map;
+}
+
+void wait(const NodeCore *node, DiskBrowserModel *model, const QModelIndex &index)
+{
+    for (auto it = waiters().constFind(node); it != waiters().constEnd() && it.key() == node; ++it)
+        if (it.value().model == model)
+            return;
+    waiters().insert(node, Waiter{model, QPersistentModelIndex(index)});
+}
+
+// Ends a model's claim on a node. `node` must still exist unless `retry` is false.
+void release(NodeCore *node, const DiskBrowserModel *model, bool retry = true)
 {
     const auto it = claims().find(node);
-    if (it != claims().end() && it.value() == model)
-        claims().erase(it);
+    if (it == claims().end() || it.value() != model)
+        return;
+    claims().erase(it);
+    const QList<Waiter> waiting = waiters().values(node);
+    waiters().remove(node);
+    if (!retry || node->isPopulated())
+        return;
+    for (const Waiter &w : waiting)
+        if (w.model && w.model != model && w.index.isValid())
+            w.model->fetchMore(w.index);
 }
 
 } // namespace
@@ -79,9 +113,12 @@ bool DiskBrowserModel::isPopulating(const NodeCore *node) const
 void DiskBrowserModel::fetchMore(const QModelIndex &parent)
 {
     NodeCore *node = nodeOf(parent);
-    if (!node || !node->canPopulate() || node->isPopulated() || isPopulating(node) ||
-        claimedElsewhere(node, this))
+    if (!node || !node->canPopulate() || node->isPopulated() || isPopulating(node))
         return;
+    if (claimedElsewhere(node, this)) {
+        wait(node, this, parent);
+        return;
+    }
     if (m_synchronous) {
         emit populationStarted(
             node, QCoreApplication::translate("NodeCore", "Populating %1").arg(node->text(NodeAttr::Name)));
@@ -162,7 +199,7 @@ void DiskBrowserModel::childrenAboutToBeRemoved(NodeCore *parent, int first, int
         NodeCore *gone = parent->child(r);
         for (qsizetype i = m_queue.size() - 1; i >= 0; --i)
             if (gone && gone->isAncestorOf(m_queue[i])) {
-                release(m_queue[i], this);
+                release(m_queue[i], this, false);
                 m_queue.removeAt(i);
             }
     }
@@ -174,7 +211,7 @@ void DiskBrowserModel::childrenAboutToBeRemoved(NodeCore *parent, int first, int
                 w->abandon();
                 w->cancel();
                 w->wait();
-                release(w->node(), this);
+                release(w->node(), this, false);
                 m_workers.removeOne(w);
                 w->disconnect(this);
                 w->deleteLater();

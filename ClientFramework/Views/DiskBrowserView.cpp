@@ -163,6 +163,8 @@ DiskBrowserView::DiskBrowserView(NodeCore *root, Core::Commander *commander, QWi
             activate(n);
     });
     connect(m_list, &QTreeView::activated, this, &DiskBrowserView::onListActivated);
+    connect(m_tree, &QTreeView::expanded, this,
+            [this](const QModelIndex &index) { m_folders->fetchMore(index); });
     connect(m_tree, &QWidget::customContextMenuRequested, this,
             [this](const QPoint &pos) { showContextMenu(m_tree, pos); });
     connect(m_list, &QWidget::customContextMenuRequested, this,
@@ -299,7 +301,8 @@ void DiskBrowserView::onTreeCurrentChanged()
         folder = filterIndexOf(n); // the root folder is filtered out: the volume's own rows
     m_list->selectionModel()->clear();
     m_list->setRootIndex(folder);
-    if (folder.isValid() && m_filter->canFetchMore(folder))
+    // Asked even while another view populates the folder: this view takes over if that one stops.
+    if (folder.isValid())
         m_filter->fetchMore(folder);
     m_pane = Pane::Tree;
     updateLocation();

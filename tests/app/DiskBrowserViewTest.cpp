@@ -701,7 +701,9 @@ TEST(DiskBrowser, KeepsItsFilterSwitchesAndPanes)
     again.load(element);
 
     // Through the main window's settings: the next window opens the browser again with them.
+    // (the process-wide settings document is put back afterwards for the tests that follow)
     QDomElement main = Framework::SettingsDocument::instance().element("main-view");
+    const QDomNode before = main.cloneNode(true);
     w.view.save(main);
     Solution::Commander commander;
     CRoot root;
@@ -710,6 +712,7 @@ TEST(DiskBrowser, KeepsItsFilterSwitchesAndPanes)
     next.build();
     next.load(main);
     auto *restored = qobject_cast<Framework::DiskBrowserView *>(next.windowManager()->view("browser"));
+    main.parentNode().replaceChild(before, main);
     ASSERT_NE(restored, nullptr);
     EXPECT_FALSE(restored->filterModel()->filter(NodeSortFilterModel::Partitions));
 }
@@ -748,25 +751,57 @@ TEST(DiskBrowser, TwoViewsPopulateOneFolderOnce)
     NodeCore *docs = listedByName(b, "DOCS");
     ASSERT_NE(docs, nullptr);
     EXPECT_TRUE(b->model()->canFetchMore(b->model()->indexOf(docs)));
-    // A view closed mid-population gives the folder back to the others.
+    // The explorer's population is cancelled (its view closed mid-way): the browser, which asked
+    // in between, takes the folder over. (Two other volumes keep the explorer's workers busy, so the
+    // folder is still waiting in its queue when it is cancelled.)
+    FolderVolume second, third;
+    for (FolderVolume *v : {&second, &third})
+        explorer->model()->fetchMore(explorer->model()->indexOf(w.addDrive(*v)->rootFolder()));
     explorer->model()->fetchMore(explorer->model()->indexOf(docs));
+    ASSERT_TRUE(explorer->model()->isPopulating(docs));
     EXPECT_FALSE(b->model()->canFetchMore(b->model()->indexOf(docs)));
+    ASSERT_TRUE(b->openFolder(docs));
+    EXPECT_FALSE(b->model()->isPopulating(docs));
     explorer->model()->cancelAll();
-    EXPECT_FALSE(docs->isPopulated());
-    EXPECT_TRUE(b->model()->canFetchMore(b->model()->indexOf(docs)));
+    EXPECT_TRUE(b->model()->isPopulating(docs));
+    ASSERT_TRUE(waitListed(b, docs));
+    EXPECT_EQ(namesOf(listed(b)), QStringList({"DEEP", "Long File Name.txt"}));
 
     // The browser closed while it populates a folder: the worker stops, the folder is free again.
-    ASSERT_TRUE(b->openFolder(docs));
-    ASSERT_TRUE(b->model()->isPopulating(docs));
-    EXPECT_FALSE(explorer->model()->canFetchMore(explorer->model()->indexOf(docs)));
+    NodeCore *deep = listedByName(b, "DEEP");
+    ASSERT_NE(deep, nullptr);
+    ASSERT_TRUE(b->openFolder(deep));
+    ASSERT_TRUE(b->model()->isPopulating(deep));
+    EXPECT_FALSE(explorer->model()->canFetchMore(explorer->model()->indexOf(deep)));
     QPointer<Framework::DiskBrowserView> closing(b);
     ASSERT_TRUE(w.windows()->closeView("browser"));
     QCoreApplication::sendPostedEvents(nullptr, QEvent::DeferredDelete);
     ASSERT_TRUE(closing.isNull());
     QApplication::processEvents();
-    if (!docs->isPopulated()) {
-        EXPECT_TRUE(explorer->model()->canFetchMore(explorer->model()->indexOf(docs)));
+    if (!deep->isPopulated()) {
+        EXPECT_TRUE(explorer->model()->canFetchMore(explorer->model()->indexOf(deep)));
     }
+}
+
+TEST(DiskBrowser, OutlivesTheTreeItShows)
+{
+    FolderVolume volume;
+    CRoot kernel;
+    auto nodes = std::make_unique<NodeRoot>(&kernel);
+    auto *drive = new NodeDrive(&volume);
+    nodes->computer()->appendChild(drive);
+    Framework::DiskBrowserView view(nodes.get(), nullptr);
+    ASSERT_TRUE(view.browseTo(drive));
+    view.model()->waitForPopulations();
+    QApplication::processEvents();
+    ASSERT_FALSE(listed(&view).isEmpty());
+    // A view still standing (closed, its deletion pending) when the tree goes.
+    nodes.reset();
+    EXPECT_EQ(view.currentFolder(), nullptr);
+    EXPECT_TRUE(view.selectedNodes().isEmpty());
+    EXPECT_TRUE(view.locationLabel()->text().isEmpty());
+    EXPECT_FALSE(view.goUp());
+    EXPECT_FALSE(view.browseTo(nullptr));
 }
 
 // A picture of the browser inside a folder, written when BRINDLE_SCREENSHOT_DIR names a folder.
@@ -792,25 +827,4 @@ TEST(DiskBrowser, Screenshot)
     ASSERT_TRUE(b->browseTo(listedByName(b, "HELLO.TXT")));
     QTest::qWait(200);
     EXPECT_TRUE(w.view.grab().save(out + "/browser.png"));
-}
-
-TEST(DiskBrowser, OutlivesTheTreeItShows)
-{
-    FolderVolume volume;
-    CRoot kernel;
-    auto nodes = std::make_unique<NodeRoot>(&kernel);
-    auto *drive = new NodeDrive(&volume);
-    nodes->computer()->appendChild(drive);
-    Framework::DiskBrowserView view(nodes.get(), nullptr);
-    ASSERT_TRUE(view.browseTo(drive));
-    view.model()->waitForPopulations();
-    QApplication::processEvents();
-    ASSERT_FALSE(listed(&view).isEmpty());
-    // A view still standing (closed, its deletion pending) when the tree goes.
-    nodes.reset();
-    EXPECT_EQ(view.currentFolder(), nullptr);
-    EXPECT_TRUE(view.selectedNodes().isEmpty());
-    EXPECT_TRUE(view.locationLabel()->text().isEmpty());
-    EXPECT_FALSE(view.goUp());
-    EXPECT_FALSE(view.browseTo(nullptr));
 }
