@@ -299,7 +299,8 @@ QString NodeCommands::osBrowserPath(NodeCore *node)
 
 bool NodeCommands::isSmartDevice(const NodeCore *node)
 {
-    return node && node->kind() == NodeKind::Device && !node->hasFlags(NodeState::Image);
+    // A mounted image has no drive to ask; the pane then says the data is not supported.
+    return node && node->kind() == NodeKind::Device;
 }
 
 void NodeCommands::updateCommands()

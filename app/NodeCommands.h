@@ -53,7 +53,7 @@ public:
 
     // The folder "Open in File Explorer" opens for a node ("" for none).
     static QString osBrowserPath(NodeCore *node);
-    // Whether "SMART Info" applies: a disk that is not a mounted image.
+    // Whether "SMART Info" applies: a disk.
     static bool isSmartDevice(const NodeCore *node);
 
 private:

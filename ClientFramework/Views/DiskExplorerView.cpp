@@ -184,6 +184,10 @@ QList<QAction *> DiskExplorerView::widgetActions(Menu menu) const
 {
     if (menu == ViewMenu)
         return m_filterActions;
+    // In the Edit menu, "Select All" has its shortcut only while this view is the active one.
+    if (menu == EditMenu && m_commander)
+        if (QAction *a = m_commander->action(QStringLiteral("cmdNode_SelectAll")))
+            return {a};
     if (menu == ActionsMenu && m_commander) {
         QList<QAction *> list;
         for (const char *id : {"cmdRefresh", "cmdRemove", "cmdProperties"})

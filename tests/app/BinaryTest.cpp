@@ -39,9 +39,10 @@ TEST(BrindleBinary, StartsAndWritesPerUserFiles)
     ASSERT_TRUE(p.waitForFinished(20000));
     EXPECT_EQ(p.exitStatus(), QProcess::NormalExit);
     text = QString::fromUtf8(TestUtil::readFile(log));
-    // The disks of this machine are listed at start: a disk the process may not open is an error
-    // of the run.
-    EXPECT_EQ(p.exitCode(), text.contains("(Permission denied)") ? 1 : 0) << text.toStdString();
+    // The disks of this machine are listed at start: a disk the process may not open is a normal
+    // condition (a warning), not a failure of the run.
+    EXPECT_EQ(p.exitCode(), 0) << text.toStdString();
+    EXPECT_FALSE(text.contains("Exiting with error code")) << text.toStdString();
     EXPECT_TRUE(text.contains("Application closed at ("));
     EXPECT_TRUE(text.trimmed().endsWith("  Application Log Closed")) << text.toStdString();
     EXPECT_TRUE(text.contains("  Application Log Started ")) << text.toStdString();
