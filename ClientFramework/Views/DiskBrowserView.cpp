@@ -169,10 +169,16 @@ DiskBrowserView::DiskBrowserView(NodeCore *root, Core::Commander *commander, QWi
             [this](const QPoint &pos) { showContextMenu(m_tree, pos); });
     connect(m_list, &QWidget::customContextMenuRequested, this,
             [this](const QPoint &pos) { showContextMenu(m_list, pos); });
-    connect(m_model, &DiskBrowserModel::populationStarted, this,
-            [this](NodeCore *, const QString &text) { emit populationStarted(text); });
-    connect(m_model, &DiskBrowserModel::populationFinished, this,
-            [this](NodeCore *, bool cancelled) { emit populationFinished(cancelled); });
+    // The status bar shows a population until the last one running has ended.
+    connect(m_model, &DiskBrowserModel::populationStarted, this, [this](NodeCore *, const QString &text) {
+        ++m_populating;
+        emit populationStarted(text);
+    });
+    connect(m_model, &DiskBrowserModel::populationFinished, this, [this](NodeCore *, bool cancelled) {
+        m_populating = qMax(0, m_populating - 1);
+        if (m_populating == 0)
+            emit populationFinished(cancelled);
+    });
     m_tree->installEventFilter(this);
     m_list->installEventFilter(this);
 

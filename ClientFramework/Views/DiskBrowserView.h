@@ -67,7 +67,7 @@ public:
     void load(const QDomElement &element) override;
 
 signals:
-    // A folder population started ("Populating %1") or ended.
+    // A folder population started ("Populating %1"), or the last one running ended.
     void populationStarted(const QString &text);
     void populationFinished(bool cancelled);
 
@@ -103,6 +103,7 @@ private:
     QAction *m_up;
     QList<QAction *> m_filterActions;
     Pane m_pane = Pane::Tree;
+    int m_populating = 0;
 };
 
 } // namespace Framework

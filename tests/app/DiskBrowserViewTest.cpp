@@ -514,6 +514,17 @@ TEST(DiskBrowser, WalksTheFoldersOfAVolume)
     EXPECT_TRUE(treeNodes(b).contains(deep));
     EXPECT_FALSE(b->folderModel()->hasChildren(b->folderModel()->mapFromSource(listIndexOf(b, deep))));
 
+    // Two populations at once: the status bar keeps its text until both have ended.
+    FolderVolume second, third;
+    QSignalSpy finished(b, &Framework::DiskBrowserView::populationFinished);
+    started.clear();
+    for (FolderVolume *v : {&second, &third})
+        b->model()->fetchMore(b->model()->indexOf(w.addDrive(*v)->rootFolder()));
+    EXPECT_EQ(started.size(), 2);
+    ASSERT_TRUE(b->model()->waitForPopulations());
+    EXPECT_EQ(finished.size(), 1);
+    EXPECT_FALSE(w.view.progressLabel()->isVisible());
+
     // Backspace and "Up" climb again; from the root folder the step skips the volume's own row.
     QTest::keyClick(b->fileList(), Qt::Key_Backspace);
     EXPECT_EQ(b->treeNode(), docs);
