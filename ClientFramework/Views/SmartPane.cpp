@@ -74,6 +74,7 @@ SmartPane::SmartPane(QWidget *parent)
     m_attributes->setHorizontalHeaderLabels({tr("ID"), tr("Name"), tr("Value"), tr("Worst"), tr("Threshold"),
                                              tr("Type"), tr("Updated"), tr("When Failed"), tr("Raw Value")});
     m_attributes->verticalHeader()->hide();
+    m_attributes->verticalHeader()->setDefaultSectionSize(m_attributes->fontMetrics().height() + 6);
     m_attributes->setEditTriggers(QAbstractItemView::NoEditTriggers);
     m_attributes->setSelectionBehavior(QAbstractItemView::SelectRows);
     m_attributes->horizontalHeader()->setStretchLastSection(true);

@@ -10,6 +10,7 @@
 #include <QAction>
 #include <QLabel>
 #include <QTableWidget>
+#include <QTest>
 #include <QTreeWidget>
 #include <gtest/gtest.h>
 
@@ -301,4 +302,20 @@ TEST(SmartText, NamesByIdAndStandardsByMinorVersion)
     EXPECT_EQ(Smart::whenFailedText(2), "Failing now");
     EXPECT_EQ(Smart::attributeUpdatedText(1), "Offline");
     EXPECT_EQ(Smart::attributeUpdatedText(0), "Always");
+}
+
+TEST(SmartPane, Screenshot)
+{
+    const QString out = qEnvironmentVariable("BRINDLE_SCREENSHOT_DIR");
+    if (out.isEmpty())
+        GTEST_SKIP() << "set BRINDLE_SCREENSHOT_DIR to write the picture";
+    FakeProvider provider = makeProvider();
+    SmartPane pane;
+    pane.setProvider(&provider);
+    FakeNode disk(NodeKind::Device, "Disk 0");
+    pane.showDevice(&disk);
+    pane.resize(760, 640);
+    pane.show();
+    QTest::qWait(200);
+    EXPECT_TRUE(pane.grab().save(out + "/smart-pane.png"));
 }
