@@ -17,8 +17,8 @@ namespace HexEditor {
 
 namespace {
 
-// Scrolls horizontally just enough that the caret's byte box lies inside the viewport. Going left,
-// the view returns to the line's start when the caret fits there, so the offsets come back into sight.
+// Keeps the caret's byte box inside the viewport: while the caret fits beside the line's start the
+// view shows the start (with the offsets); further right it scrolls just enough.
 void followCaretHorizontally(EditorCtrl &ctrl)
 {
     QScrollBar *h = ctrl.horizontalScrollBar();
@@ -30,8 +30,10 @@ void followCaretHorizontally(EditorCtrl &ctrl)
     const int left = std::max(0, ctrl.byteLeft(pane, caret.column));
     const int right = ctrl.byteRight(pane, caret.column);
     int value = h->value();
-    if (left < value)
-        value = right <= width ? 0 : left;
+    if (right <= width)
+        value = 0;
+    else if (left < value)
+        value = left;
     else if (right > value + width)
         value = right - width > left ? left : right - width;
     if (value != h->value())
@@ -408,6 +410,7 @@ void EditorCtrl::resizeEvent(QResizeEvent *event)
     setTopLine(topLine());
     m_painter->invalidate();
     syncScrollBars();
+    followCaretHorizontally(*this);
 }
 
 void EditorCtrl::paintEvent(QPaintEvent *event)

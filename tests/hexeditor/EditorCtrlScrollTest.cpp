@@ -115,3 +115,47 @@ TEST_F(EditorCtrlScroll, AWideWindowNeverScrolls)
     EXPECT_EQ(ctrl->caret().column, 63);
     EXPECT_TRUE(caretVisible());
 }
+
+TEST_F(EditorCtrlScroll, ANewWindowSizeShowsTheLineStartWhenTheCaretFitsThere)
+{
+    // A caret near the line's start, placed while the window is tiny, scrolls a little...
+    ctrl->resize(90, 300);
+    QCoreApplication::processEvents();
+    ctrl->setCaretOffset(2);
+    ASSERT_TRUE(caretVisible());
+    ASSERT_GT(hValue(), 0);
+    // ...and the grown window shows the offsets again.
+    ctrl->resize(700, 300);
+    QCoreApplication::processEvents();
+    EXPECT_EQ(hValue(), 0);
+    EXPECT_TRUE(caretVisible());
+
+    // A window that shrinks keeps a caret at the line's end in sight.
+    ctrl->setCaretOffset(15);
+    ctrl->resize(200, 300);
+    QCoreApplication::processEvents();
+    EXPECT_TRUE(caretVisible());
+    EXPECT_GT(hValue(), 0);
+}
+
+TEST_F(EditorCtrlScroll, HomeShowsTheOffsetsAgainWhenTheLineIsOnlyABitWider)
+{
+    // The line is a little wider than the window: at its end the first byte stays in sight.
+    const int frame = ctrl->width() - ctrl->viewport()->width();
+    ctrl->resize(ctrl->byteRight(Metrics::PaneHex, 15) - 3 * ctrl->cellWidth() + frame, 300);
+    QCoreApplication::processEvents();
+    key(Qt::Key_End);
+    ASSERT_GT(hValue(), 0);
+    ASSERT_LT(hValue(), ctrl->byteLeft(Metrics::PaneHex, 0)) << "column 0 is still visible";
+    key(Qt::Key_Home);
+    EXPECT_EQ(hValue(), 0);
+    // Stepping left from the end brings the start back once the caret fits beside it.
+    key(Qt::Key_End);
+    ASSERT_GT(hValue(), 0);
+    for (int i = 0; i < 8 && hValue() > 0; ++i) {
+        key(Qt::Key_Left);
+        key(Qt::Key_Left);
+    }
+    EXPECT_EQ(hValue(), 0);
+    EXPECT_TRUE(caretVisible());
+}
