@@ -73,6 +73,16 @@ TEST_F(EditorCtrlScroll, GoToAndTextPanesScrollToo)
     EXPECT_TRUE(caretVisible());
     ctrl->setCaretOffset(0);
     EXPECT_EQ(hValue(), 0);
+
+    // All four columns: the Unicode column is the rightmost.
+    ctrl->setColumns(Metrics::PaneOffset | Metrics::PaneHex | Metrics::PaneAscii | Metrics::PaneUnicode);
+    ctrl->setCaretPane(Metrics::PaneUnicode);
+    ASSERT_EQ(ctrl->caret().pane, Metrics::PaneUnicode);
+    key(Qt::Key_End);
+    EXPECT_TRUE(caretVisible());
+    EXPECT_GT(hValue(), ctrl->horizontalScrollBar()->maximum() - 2 * ctrl->cellWidth());
+    ctrl->setCaretOffset(16 * 7 + 4);
+    EXPECT_TRUE(caretVisible());
 }
 
 TEST_F(EditorCtrlScroll, ACaretAlreadyInSightDoesNotMoveTheView)
