@@ -11,6 +11,7 @@
 #include "ClientFramework/Views/WindowManager.h"
 
 #include "Kernel/Implementation/Device.h"
+#include "Kernel/Implementation/FS/Entry.h"
 #include "Kernel/Implementation/Images/ImageHandle.h"
 #include "Kernel/Implementation/Partition.h"
 
@@ -283,18 +284,45 @@ QString NodeCommands::osBrowserPath(NodeCore *node)
         return QString();
     }
     auto *storage = dynamic_cast<IKernelStorage *>(node);
-    if (!storage || node->kind() == NodeKind::File)
+    if (!storage)
         return QString();
-    if (CPartition *p = storage->kernelPartition())
+    // Where the system mounted the volume.
+    QString mountPoint;
+    if (CPartition *p = storage->kernelPartition()) {
         if (const VolumeInfo *v = p->GetVolumeInfo())
-            return existingFolder(v->mountPoint);
-    // A device that is one volume as a whole.
-    if (node->kind() == NodeKind::Drive)
-        if (CDevice *d = storage->kernelDevice())
-            for (const VolumeInfo &v : d->GetDescriptor().volumes)
-                if (!v.mountPoint.isEmpty())
-                    return existingFolder(v.mountPoint);
-    return QString();
+            mountPoint = v->mountPoint;
+    } else if (CDevice *d = storage->kernelDevice()) {
+        // A device that is one volume as a whole.
+        for (const VolumeInfo &v : d->GetDescriptor().volumes)
+            if (!v.mountPoint.isEmpty()) {
+                mountPoint = v.mountPoint;
+                break;
+            }
+    }
+    mountPoint = existingFolder(mountPoint);
+    if (mountPoint.isEmpty())
+        return QString();
+    // A folder opens as itself below the mount point, a file as its folder.
+    CEntry *entry = storage->kernelEntry();
+    if (entry && node->kind() == NodeKind::File)
+        entry = entry->GetParent();
+    QStringList names;
+    for (CEntry *e = entry; e && e->GetParent(); e = e->GetParent())
+        names.prepend(e->GetName());
+    return folderBelow(mountPoint, names);
+}
+
+QString NodeCommands::folderBelow(const QString &mountPoint, const QStringList &names)
+{
+    if (names.isEmpty())
+        return mountPoint;
+    // Names come from the medium: one that would leave its folder keeps the mount point.
+    for (const QString &n : names)
+        if (n.isEmpty() || n == QLatin1String(".") || n == QLatin1String("..") ||
+            n.contains(QLatin1Char('/')) || n.contains(QLatin1Char('\\')) || n.contains(QChar(0)))
+            return mountPoint;
+    const QString path = existingFolder(mountPoint + QLatin1Char('/') + names.join(QLatin1Char('/')));
+    return path.isEmpty() ? mountPoint : path;
 }
 
 bool NodeCommands::isSmartDevice(const NodeCore *node)

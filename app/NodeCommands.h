@@ -51,8 +51,13 @@ public:
     // Whether any population runs.
     bool isPopulating() const { return !m_busy.isEmpty(); }
 
-    // The folder "Open in File Explorer" opens for a node ("" for none).
+    // The folder "Open in File Explorer" opens for a node ("" for none): an image file's folder for
+    // a mounted image, the mount point for a volume the system mounted, the folder itself below it
+    // for a folder of that volume (a file: its folder).
     static QString osBrowserPath(NodeCore *node);
+    // The folder of the names below a mount point; the mount point itself when a name could leave
+    // its folder ("..", a separator) or the folder does not exist.
+    static QString folderBelow(const QString &mountPoint, const QStringList &names);
     // Whether "SMART Info" applies: a disk.
     static bool isSmartDevice(const NodeCore *node);
 

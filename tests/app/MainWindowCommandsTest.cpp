@@ -547,3 +547,26 @@ TEST(MainWindowCommands, SelectAllSelectsEveryRowOfTheActiveNodeView)
     EXPECT_FALSE(selectAll->isEnabled());
     EXPECT_FALSE(edit->actions().contains(selectAll));
 }
+
+TEST(MainWindowCommands, OpenInFileExplorerStaysBelowTheMountPoint)
+{
+    QTemporaryDir dir;
+    const QString mount = QFileInfo(dir.path()).absoluteFilePath();
+    ASSERT_TRUE(QDir().mkpath(mount + "/DOCS/DEEP"));
+    ASSERT_TRUE(QDir().mkpath(mount + "/../outside-" + QFileInfo(mount).fileName()));
+    using Solution::NodeCommands;
+    EXPECT_EQ(NodeCommands::folderBelow(mount, {}), mount);
+    EXPECT_EQ(NodeCommands::folderBelow(mount, {"DOCS"}), mount + "/DOCS");
+    EXPECT_EQ(NodeCommands::folderBelow(mount, {"DOCS", "DEEP"}), mount + "/DOCS/DEEP");
+    // A folder the system does not show (not there, or not yet synced): the volume's own folder.
+    EXPECT_EQ(NodeCommands::folderBelow(mount, {"DOCS", "GONE"}), mount);
+    // Names read from the medium never lead out of the volume's folder.
+    EXPECT_EQ(NodeCommands::folderBelow(mount, {".."}), mount);
+    EXPECT_EQ(NodeCommands::folderBelow(mount, {"..", "outside-" + QFileInfo(mount).fileName()}), mount);
+    EXPECT_EQ(NodeCommands::folderBelow(mount, {"DOCS", "..", ".."}), mount);
+    EXPECT_EQ(NodeCommands::folderBelow(mount, {"DOCS/DEEP"}), mount);
+    EXPECT_EQ(NodeCommands::folderBelow(mount, {"DOCS\\DEEP"}), mount);
+    EXPECT_EQ(NodeCommands::folderBelow(mount, {"DOCS", ""}), mount);
+    EXPECT_EQ(NodeCommands::folderBelow(mount, {"."}), mount);
+    QDir(mount + "/../outside-" + QFileInfo(mount).fileName()).removeRecursively();
+}
