@@ -111,6 +111,10 @@ void NodeCommands::onStarted(NodeCore *node)
 {
     if (!node)
         return;
+    if (m_stopWhenStarted.remove(node))
+        for (DiskBrowserModel *m : models())
+            if (Threads::NodeTagged *w = workerOf(m, node))
+                w->cancel(); // before its thread starts: the population ends at once, cancelled
     m_busy.insert(node);
     node->setFlags(NodeState::Busy, true);
     node->notifyChanged();
@@ -119,6 +123,7 @@ void NodeCommands::onStarted(NodeCore *node)
 
 void NodeCommands::onFinished(NodeCore *node)
 {
+    m_stopWhenStarted.remove(node);
     if (!m_busy.remove(node))
         return;
     // Another view may still populate the same folder.
@@ -134,6 +139,8 @@ void NodeCommands::onFinished(NodeCore *node)
 void NodeCommands::prune()
 {
     // Only pointers are compared here: a node whose population was dropped may be gone.
+    for (auto it = m_stopWhenStarted.begin(); it != m_stopWhenStarted.end();)
+        it = anyModelPopulates(*it) ? std::next(it) : m_stopWhenStarted.erase(it);
     bool changed = false;
     for (auto it = m_busy.begin(); it != m_busy.end();) {
         if (anyModelPopulates(*it)) {
@@ -172,11 +179,27 @@ int NodeCommands::stop(const QList<NodeCore *> &nodes)
                     break;
                 }
         }
+    // A selected folder still waiting for a worker is stopped the moment its worker is made.
+    for (DiskBrowserModel *m : models())
+        for (NodeCore *n : nodes)
+            if (n && m->isPopulating(n) && !workerOf(m, n) && !m_stopWhenStarted.contains(n)) {
+                m_stopWhenStarted.insert(n);
+                ++cancelled;
+            }
     return cancelled;
+}
+
+Threads::NodeTagged *NodeCommands::workerOf(DiskBrowserModel *model, const NodeCore *node)
+{
+    for (Threads::NodeTagged *w : model->findChildren<Threads::NodeTagged *>())
+        if (w->node() == node && !w->tag().isCancelled() && model->isPopulating(node))
+            return w;
+    return nullptr;
 }
 
 void NodeCommands::stopAll()
 {
+    m_stopWhenStarted.clear();
     for (DiskBrowserModel *m : models())
         m->cancelAll();
     prune();

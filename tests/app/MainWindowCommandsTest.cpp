@@ -113,7 +113,7 @@ public:
     }
 };
 
-// A ready volume in memory: "few" with seven files and "many" with twenty thousand.
+// A ready volume in memory: "few" with seven files, "many" and "more" with twenty thousand each.
 struct MediumHolder
 {
     MemoryStorage medium;
@@ -131,6 +131,9 @@ public:
         CEntry *many = add(root.get(), "many", CEntry::AttrFolder);
         for (int i = 0; i < ManyFiles; ++i)
             add(many, QString("f%1").arg(i), 0x20);
+        CEntry *more = add(root.get(), "more", CEntry::AttrFolder);
+        for (int i = 0; i < ManyFiles; ++i)
+            add(more, QString("g%1").arg(i), 0x20);
         SetRootEntry(std::move(root));
     }
 
@@ -569,4 +572,47 @@ TEST(MainWindowCommands, OpenInFileExplorerStaysBelowTheMountPoint)
     EXPECT_EQ(NodeCommands::folderBelow(mount, {"DOCS", ""}), mount);
     EXPECT_EQ(NodeCommands::folderBelow(mount, {"."}), mount);
     QDir(mount + "/../outside-" + QFileInfo(mount).fileName()).removeRecursively();
+}
+
+TEST(MainWindowCommands, StopReachesAFolderWaitingForAWorker)
+{
+    Window w;
+    FolderVolume volume;
+    ASSERT_NE(w.addFolders(volume), nullptr);
+    NodeCore *many = w.named("many");
+    NodeCore *more = w.named("more");
+    NodeCore *few = w.named("few");
+    ASSERT_TRUE(many && more && few);
+    DiskBrowserModel *model = w.explorer()->model();
+    Solution::NodeCommands *commands = w.view.nodeCommands();
+    QList<QPair<NodeCore *, bool>> ended;
+    QObject::connect(model, &DiskBrowserModel::populationFinished, [&](NodeCore *n, bool cancelled) {
+        ended.append({n, cancelled});
+    });
+
+    // Two workers run at most: "few" waits behind "many" and "more".
+    model->fetchMore(model->indexOf(many));
+    model->fetchMore(model->indexOf(more));
+    model->fetchMore(model->indexOf(few));
+    ASSERT_TRUE(model->isPopulating(few));
+    EXPECT_FALSE(few->state() & NodeState::Busy);
+    EXPECT_EQ(commands->stop({few}), 1);
+    EXPECT_EQ(commands->stop({few}), 0); // asked once is enough
+
+    // "many" and "more" go on; "few" ends cancelled as soon as its turn comes.
+    ASSERT_TRUE(QTest::qWaitFor([&] { return ended.size() == 3; }, 60000));
+    for (const auto &[node, cancelled] : ended)
+        EXPECT_EQ(cancelled, node == few) << node->text(NodeAttr::Name).toStdString();
+    EXPECT_FALSE(few->isPopulated());
+    EXPECT_TRUE(many->isPopulated());
+    EXPECT_TRUE(more->isPopulated());
+    EXPECT_FALSE(commands->isPopulating());
+    EXPECT_FALSE(w.commander.isProcessRunning());
+
+    // The stop was for that population only: the folder populates when asked again.
+    ended.clear();
+    model->fetchMore(model->indexOf(few));
+    ASSERT_TRUE(QTest::qWaitFor([&] { return ended.size() == 1; }, 10000));
+    EXPECT_FALSE(ended[0].second);
+    EXPECT_EQ(few->childCount(), FewFiles);
 }
