@@ -67,6 +67,9 @@ MainView::MainView(Commander *commander, QWidget *parent) : Framework::MainView(
 
 MainView::~MainView()
 {
+    // The node commands go first: nothing of the views' teardown reaches them.
+    delete m_nodeCommands;
+    m_nodeCommands = nullptr;
     // The views go before the tree they show.
     m_monitor.reset();
     m_deviceChange.reset();

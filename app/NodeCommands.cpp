@@ -66,6 +66,14 @@ NodeCommands::NodeCommands(Core::Commander *commander, Framework::WindowManager 
     updateCommands();
 }
 
+NodeCommands::~NodeCommands()
+{
+    if (!m_commander)
+        return;
+    for (const QString &id : {Update, Stop, StopAll, SelectAll, OpenInOS, SmartInfo})
+        m_commander->setHandler(id, {});
+}
+
 void NodeCommands::watchView(Framework::GenericView *view)
 {
     if (!view)

@@ -41,6 +41,8 @@ public:
     NodeCommands(Core::Commander *commander, Framework::WindowManager *windows,
                  std::function<void(NodeCore *)> reloadDevice, const QString &smartPaneId,
                  QObject *parent = nullptr);
+    // Takes its handlers out of the registry.
+    ~NodeCommands() override;
 
     // Re-populates the nodes: folders are read again from their volume (files through their
     // folder); disks, partitions and volumes through their device; the computer lists every device
@@ -79,7 +81,7 @@ private:
     static Threads::NodeTagged *workerOf(DiskBrowserModel *model, const NodeCore *node);
     QList<DiskBrowserModel *> models() const;
 
-    Core::Commander *m_commander;
+    QPointer<Core::Commander> m_commander;
     Framework::WindowManager *m_windows;
     std::function<void(NodeCore *)> m_reloadDevice;
     QString m_smartPaneId;

@@ -616,3 +616,39 @@ TEST(MainWindowCommands, StopReachesAFolderWaitingForAWorker)
     EXPECT_FALSE(ended[0].second);
     EXPECT_EQ(few->childCount(), FewFiles);
 }
+
+TEST(MainWindowCommands, WindowClosesWhilePopulationsRun)
+{
+    ScratchHome home;
+    RecordingDialogs dialogs;
+    FolderVolume volume;
+    CRoot root;
+    Solution::Commander commander; // outlives the window, as at start-up
+    auto view = std::make_unique<Solution::MainView>(&commander);
+    view->setKernel(&root);
+    view->build();
+    view->load(QDomElement());
+    auto *explorer = qobject_cast<Framework::DiskExplorerView *>(view->windowManager()->openView("explorer"));
+    ASSERT_NE(explorer, nullptr);
+    auto *drive = new NodeDrive(&volume);
+    view->nodeRoot()->computer()->appendChild(drive);
+    NodeCore *top = drive->rootFolder();
+    ASSERT_NE(top, nullptr);
+    DiskBrowserModel *model = explorer->model();
+    model->setSynchronous(true);
+    model->fetchMore(model->indexOf(top));
+    model->setSynchronous(false);
+    ASSERT_EQ(top->childCount(), 3);
+    for (NodeCore *folder : top->children())
+        model->fetchMore(model->indexOf(folder));
+    ASSERT_TRUE(commander.isProcessRunning());
+    ASSERT_TRUE(commander.hasHandler("cmdNode_StopAll"));
+
+    // The populations end with their views; the window's handlers leave the registry.
+    view.reset();
+    EXPECT_FALSE(commander.hasHandler("cmdNode_Stop"));
+    EXPECT_FALSE(commander.hasHandler("cmdNode_StopAll"));
+    EXPECT_FALSE(commander.hasHandler("cmdUpdate"));
+    EXPECT_FALSE(commander.action("cmdNode_StopAll")->isEnabled());
+    commander.action("cmdNode_StopAll")->trigger(); // reaches nothing that is gone
+}
