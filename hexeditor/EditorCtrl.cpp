@@ -18,8 +18,9 @@ namespace HexEditor {
 namespace {
 
 // Keeps the caret's byte box inside the viewport: while the caret fits beside the line's start the
-// view shows the start (with the offsets); further right it scrolls just enough.
-void followCaretHorizontally(EditorCtrl &ctrl)
+// view shows the start (with the offsets), unless `stay` (a caret placed under the mouse pointer,
+// which must not move the bytes under it); further right it scrolls just enough.
+void followCaretHorizontally(EditorCtrl &ctrl, bool stay)
 {
     QScrollBar *h = ctrl.horizontalScrollBar();
     const int width = ctrl.viewport()->width();
@@ -30,7 +31,7 @@ void followCaretHorizontally(EditorCtrl &ctrl)
     const int left = std::max(0, ctrl.byteLeft(pane, caret.column));
     const int right = ctrl.byteRight(pane, caret.column);
     int value = h->value();
-    if (right <= width)
+    if (right <= width && !stay)
         value = 0;
     else if (left < value)
         value = left;
@@ -153,7 +154,7 @@ void EditorCtrl::placeCaret(uint64_t offset, int32_t pane, int32_t nibble)
     if (scrollIntoView(m_caret.line))
         m_painter->invalidate();
     syncScrollBars();
-    followCaretHorizontally(*this);
+    followCaretHorizontally(*this, m_mouseSelecting);
     caretChanged();
     viewport()->update();
 }
@@ -410,7 +411,7 @@ void EditorCtrl::resizeEvent(QResizeEvent *event)
     setTopLine(topLine());
     m_painter->invalidate();
     syncScrollBars();
-    followCaretHorizontally(*this);
+    followCaretHorizontally(*this, false);
 }
 
 void EditorCtrl::paintEvent(QPaintEvent *event)

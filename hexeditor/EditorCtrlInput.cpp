@@ -200,6 +200,8 @@ void EditorCtrl::mousePressEvent(QMouseEvent *event)
     }
     const uint64_t offset = hitOffset(hit);
     const bool shift = event->modifiers() & Qt::ShiftModifier;
+    // Set first: the caret placed under the pointer keeps the view where it is.
+    m_mouseSelecting = true;
     if (shift) {
         if (m_anchor == NoAnchor)
             m_anchor = caretOffset();
@@ -209,7 +211,6 @@ void EditorCtrl::mousePressEvent(QMouseEvent *event)
         m_anchor = offset;
         placeCaret(offset, hit.pane, hit.nibble);
     }
-    m_mouseSelecting = true;
     for (const TemplateArea &t : m_coloring) {
         if (t.field >= 0 && t.area.contains(offset)) {
             emit templateFieldClicked(t.field, offset);

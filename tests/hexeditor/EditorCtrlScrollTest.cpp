@@ -169,3 +169,23 @@ TEST_F(EditorCtrlScroll, HomeShowsTheOffsetsAgainWhenTheLineIsOnlyABitWider)
     EXPECT_EQ(hValue(), 0);
     EXPECT_TRUE(caretVisible());
 }
+
+TEST_F(EditorCtrlScroll, AClickNeverMovesTheBytesUnderThePointer)
+{
+    // Scrolled a little by hand: the first bytes are still in sight, the offsets are not.
+    ctrl->horizontalScrollBar()->setValue(ctrl->byteLeft(Metrics::PaneHex, 0) - ctrl->cellWidth());
+    const int value = hValue();
+    ASSERT_GT(value, 0);
+    QPoint p = cellPoint(16 * 2 + 1);
+    p.rx() -= value;
+    QTest::mousePress(ctrl->viewport(), Qt::LeftButton, Qt::NoModifier, p);
+    EXPECT_EQ(ctrl->caretOffset(), 16u * 2 + 1);
+    EXPECT_EQ(hValue(), value);
+    QTest::mouseRelease(ctrl->viewport(), Qt::LeftButton, Qt::NoModifier, p);
+    EXPECT_EQ(ctrl->caretOffset(), 16u * 2 + 1);
+    EXPECT_EQ(hValue(), value);
+    // The keyboard brings the line's start back.
+    key(Qt::Key_Left);
+    key(Qt::Key_Left);
+    EXPECT_EQ(hValue(), 0);
+}
