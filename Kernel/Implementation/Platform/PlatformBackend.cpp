@@ -4,6 +4,28 @@
 
 IPlatformBackend::~IPlatformBackend() = default;
 
+IPlatformBackend::TransferResult IPlatformBackend::ReadAt(PlatformHandle handle, uint64_t position,
+                                                          void *buffer, uint32_t size, uint32_t &done,
+                                                          uint32_t &error)
+{
+    done = 0;
+    uint64_t reached = 0;
+    if (!SetPosition(handle, int64_t(position), SeekOrigin::Begin, reached, error))
+        return TransferResult::PositionFailed;
+    return Read(handle, buffer, size, done, error) ? TransferResult::Done : TransferResult::TransferFailed;
+}
+
+IPlatformBackend::TransferResult IPlatformBackend::WriteAt(PlatformHandle handle, uint64_t position,
+                                                           const void *buffer, uint32_t size, uint32_t &done,
+                                                           uint32_t &error)
+{
+    done = 0;
+    uint64_t reached = 0;
+    if (!SetPosition(handle, int64_t(position), SeekOrigin::Begin, reached, error))
+        return TransferResult::PositionFailed;
+    return Write(handle, buffer, size, done, error) ? TransferResult::Done : TransferResult::TransferFailed;
+}
+
 IPlatformBackend &DefaultPlatformBackend()
 {
     static LinuxBackend backend;

@@ -36,6 +36,18 @@ public:
     virtual bool Write(PlatformHandle handle, const void *buffer, uint32_t size, uint32_t &done,
                        uint32_t &error) = 0;
 
+    // Transfer at an absolute position (at most INT64_MAX). PositionFailed: the position could not be
+    // reached and nothing was transferred; TransferFailed: the transfer itself failed after done bytes.
+    // A back end whose TransfersKeepPosition() is true leaves the handle's position where it was;
+    // otherwise the position ends after the bytes transferred. The default positions the handle and
+    // transfers at the current position.
+    enum class TransferResult : uint32_t { Done = 0, PositionFailed = 1, TransferFailed = 2 };
+    virtual TransferResult ReadAt(PlatformHandle handle, uint64_t position, void *buffer, uint32_t size,
+                                  uint32_t &done, uint32_t &error);
+    virtual TransferResult WriteAt(PlatformHandle handle, uint64_t position, const void *buffer,
+                                   uint32_t size, uint32_t &done, uint32_t &error);
+    virtual bool TransfersKeepPosition() const { return false; }
+
     virtual bool GetFileSize(PlatformHandle handle, uint64_t &size, uint32_t &error) = 0;
     // Cuts or extends the file at the current position.
     virtual bool SetEndOfFile(PlatformHandle handle, uint32_t &error) = 0;

@@ -258,6 +258,7 @@ bool CPlatformFile::Resize(uint64_t newSize)
         return false;
     uint32_t error = 0;
     uint64_t position = 0;
+    m_positionPending = false;
     if (newSize > uint64_t(INT64_MAX) ||
         !Backend().SetPosition(m_handle, int64_t(newSize), SeekOrigin::Begin, position, error)) {
         m_error = error ? error : SystemError::InvalidParameter;
@@ -283,7 +284,7 @@ bool CPlatformFile::GetPosition(uint64_t &position)
     if (!EnsureOpen())
         return false;
     uint32_t error = 0;
-    if (!Backend().SetPosition(m_handle, 0, SeekOrigin::Current, position, error)) {
+    if (!SyncPosition(error) || !Backend().SetPosition(m_handle, 0, SeekOrigin::Current, position, error)) {
         m_error = error;
         Record(PlatformOperation::SetFilePointerEx, 0, 0, error);
         return false;
@@ -291,46 +292,75 @@ bool CPlatformFile::GetPosition(uint64_t &position)
     return true;
 }
 
+// Read and Write hand over to ReadWrite, which holds the lock for the whole transfer.
 bool CPlatformFile::Read(uint64_t pos, uint32_t size, void *buffer)
 {
-    QMutexLocker guard(&m_lock);
     return ReadWrite(true, pos, size, buffer);
 }
 
 bool CPlatformFile::Write(uint64_t pos, uint32_t size, const void *buffer)
 {
-    QMutexLocker guard(&m_lock);
     return ReadWrite(false, pos, size, const_cast<void *>(buffer));
 }
 
-// One transfer at the current position; a buffer not aligned to 4 bytes goes through a temporary one.
-bool CPlatformFile::Attempt(bool read, uint32_t size, void *buffer, uint32_t &done)
+bool CPlatformFile::SyncPosition(uint32_t &error)
 {
-    IPlatformBackend &backend = Backend();
+    if (!m_positionPending)
+        return true;
+    m_positionPending = false;
+    uint64_t reached = 0;
+    return Backend().SetPosition(m_handle, int64_t(m_position), SeekOrigin::Begin, reached, error);
+}
+
+// One transfer at pos; a buffer not aligned to 4 bytes goes through a temporary one. Sets the error of
+// a failed positioning or transfer.
+IPlatformBackend::TransferResult CPlatformFile::Attempt(IPlatformBackend &backend, bool read, uint64_t pos,
+                                                        uint32_t size, void *buffer, uint32_t &done)
+{
+    using Result = IPlatformBackend::TransferResult;
+    constexpr uint32_t kKeptBounce = 1u << 20;
     uint32_t error = 0;
     done = 0;
-    bool ok;
+    Result result;
     if ((reinterpret_cast<std::uintptr_t>(buffer) & 3) == 0) {
-        ok = read ? backend.Read(m_handle, buffer, size, done, error)
-                  : backend.Write(m_handle, buffer, size, done, error);
+        result = read ? backend.ReadAt(m_handle, pos, buffer, size, done, error)
+                      : backend.WriteAt(m_handle, pos, buffer, size, done, error);
     } else {
-        std::unique_ptr<uint8_t[]> temp(new uint8_t[size ? size : 1]);
-        if (read) {
-            ok = backend.Read(m_handle, temp.get(), size, done, error);
-            if (ok)
-                std::memcpy(buffer, temp.get(), std::min(done, size));
+        std::unique_ptr<uint8_t[]> large;
+        uint8_t *temp;
+        if (size <= kKeptBounce) {
+            if (m_bounce.size() < size)
+                m_bounce.resize(size);
+            temp = m_bounce.data();
         } else {
-            std::memcpy(temp.get(), buffer, size);
-            ok = backend.Write(m_handle, temp.get(), size, done, error);
+            large.reset(new uint8_t[size]);
+            temp = large.get();
+        }
+        if (read) {
+            result = backend.ReadAt(m_handle, pos, temp, size, done, error);
+            if (result == Result::Done)
+                std::memcpy(buffer, temp, std::min(done, size));
+        } else {
+            if (size)
+                std::memcpy(temp, buffer, size);
+            result = backend.WriteAt(m_handle, pos, temp, size, done, error);
         }
     }
-    if (!ok)
+    if (result != Result::PositionFailed && backend.TransfersKeepPosition()) {
+        // The handle would have stood after the bytes transferred.
+        m_position = pos + std::min(done, size);
+        m_positionPending = true;
+    }
+    if (result == Result::PositionFailed)
+        m_error = error ? error : SystemError::NegativeSeek;
+    else if (result == Result::TransferFailed)
         m_error = error ? error : SystemError::GenFailure;
-    return ok;
+    return result;
 }
 
 bool CPlatformFile::ReadWrite(bool read, uint64_t pos, uint32_t size, void *buffer)
 {
+    using Result = IPlatformBackend::TransferResult;
     QMutexLocker guard(&m_lock);
     m_error = 0;
     if (!EnsureOpen())
@@ -345,34 +375,24 @@ bool CPlatformFile::ReadWrite(bool read, uint64_t pos, uint32_t size, void *buff
         return false;
     }
     const PlatformOperation op = read ? PlatformOperation::ReadFile : PlatformOperation::WriteFile;
+    if (pos > uint64_t(INT64_MAX)) {
+        m_error = SystemError::NegativeSeek;
+        Record(PlatformOperation::SetFilePointerEx, pos, size, m_error);
+        return false;
+    }
     IPlatformBackend &backend = Backend();
-    auto position = [&]() -> bool {
-        uint32_t error = 0;
-        uint64_t reached = 0;
-        if (pos > uint64_t(INT64_MAX) ||
-            !backend.SetPosition(m_handle, int64_t(pos), SeekOrigin::Begin, reached, error)) {
-            m_error = error ? error : SystemError::NegativeSeek;
+
+    // Attempts are counted from the first failure on: a transfer that succeeds never asks.
+    uint32_t attempts = 0;
+    bool reopened = false;
+    for (;;) {
+        uint32_t done = 0;
+        const Result result = Attempt(backend, read, pos, size, buffer, done);
+        if (result == Result::PositionFailed) {
             Record(PlatformOperation::SetFilePointerEx, pos, size, m_error);
             return false;
         }
-        return true;
-    };
-    if (!position())
-        return false;
-
-    uint32_t attempts = 1;
-    if (m_kind == PlatformKind::Device || m_kind == PlatformKind::Volume)
-        attempts = m_owner ? m_owner->RetryCount(0) : 2;
-    if (attempts == 0)
-        attempts = 1;
-    bool reopened = false;
-    bool first = true;
-    for (;;) {
-        if (!first && !position())
-            return false;
-        first = false;
-        uint32_t done = 0;
-        if (Attempt(read, size, buffer, done)) {
+        if (result == Result::Done) {
             if (done == size)
                 return true;
             m_error = SystemError::HandleEof;
@@ -399,6 +419,13 @@ bool CPlatformFile::ReadWrite(bool read, uint64_t pos, uint32_t size, void *buff
                         (m_kind == PlatformKind::Volume && error == SystemError::FileInvalid))) {
             m_lost = error;
             return false;
+        }
+        if (attempts == 0) {
+            attempts = 1;
+            if (m_kind == PlatformKind::Device || m_kind == PlatformKind::Volume)
+                attempts = m_owner ? m_owner->RetryCount(0) : 2;
+            if (attempts == 0)
+                attempts = 1;
         }
         if (--attempts == 0) {
             Record(op, pos, size, error);
@@ -608,6 +635,7 @@ bool CPlatformFile::Close(bool deleteFile)
     }
     m_writable = 1;
     m_handle = NullPlatformHandle;
+    m_positionPending = false;
     Debug(__LINE__, 3, QStringLiteral("Close: ") + m_name);
     if (m_kind == PlatformKind::File && deleteFile) {
         IPlatformBackend &backend = Backend();
@@ -635,6 +663,10 @@ bool CPlatformFile::IsLost()
 PlatformHandle CPlatformFile::GetHandle()
 {
     QMutexLocker guard(&m_lock);
+    // Whoever uses the handle itself finds it where the last transfer left it.
+    uint32_t ignored = 0;
+    if (m_handle != NullPlatformHandle)
+        SyncPosition(ignored);
     return m_handle;
 }
 

@@ -9,6 +9,7 @@
 #include <QString>
 
 #include <cstdint>
+#include <vector>
 
 class cRoot;
 
@@ -105,7 +106,10 @@ protected:
     void Internal(const QString &text) const;
     void Debug(uint32_t line, uint32_t level, const QString &text) const;
     void Record(PlatformOperation op, uint64_t position, uint64_t block, uint32_t error) const;
-    bool Attempt(bool read, uint32_t size, void *buffer, uint32_t &done);
+    IPlatformBackend::TransferResult Attempt(IPlatformBackend &backend, bool read, uint64_t pos,
+                                             uint32_t size, void *buffer, uint32_t &done);
+    // Moves the handle to the position a transfer left it at, where the back end did not move it.
+    bool SyncPosition(uint32_t &error);
 
     QRecursiveMutex m_lock;
     cRoot *m_owner = nullptr;
@@ -116,4 +120,12 @@ protected:
     uint8_t m_writable = 1;
     uint8_t m_locked = 0;
     uint32_t m_lost = 0;
+
+private:
+    // Where the handle stands after the last transfer when the back end transfers without moving it;
+    // the handle is moved there before anything reads or uses its position.
+    uint64_t m_position = 0;
+    bool m_positionPending = false;
+    // The temporary buffer of transfers from and to unaligned buffers, kept between transfers.
+    std::vector<uint8_t> m_bounce;
 };

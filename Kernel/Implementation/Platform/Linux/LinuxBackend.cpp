@@ -111,6 +111,26 @@ uint32_t transferError(int fd, int err)
     return errnoToTransferError(err);
 }
 
+// Whether the handle can be positioned at the offset, as a seek before a transfer would have. A block
+// device refuses a position past its end, where a positioned transfer merely finds nothing; the
+// check runs only after a transfer that moved no byte, so the common path costs one call.
+bool reachable(int fd, uint64_t position, uint32_t &error)
+{
+    if (::lseek(fd, off_t(position), SEEK_SET) >= 0)
+        return true;
+    error = errnoToSystemError(errno);
+    return false;
+}
+
+IPlatformBackend::TransferResult failedTransfer(int fd, uint64_t position, uint32_t done, int err,
+                                                uint32_t &error)
+{
+    if (done == 0 && !reachable(fd, position, error))
+        return IPlatformBackend::TransferResult::PositionFailed;
+    error = transferError(fd, err);
+    return IPlatformBackend::TransferResult::TransferFailed;
+}
+
 } // namespace
 
 LinuxBackend::LinuxBackend() = default;
@@ -214,6 +234,51 @@ bool LinuxBackend::Write(PlatformHandle handle, const void *buffer, uint32_t siz
         done += uint32_t(n);
     }
     return true;
+}
+
+IPlatformBackend::TransferResult LinuxBackend::ReadAt(PlatformHandle handle, uint64_t position, void *buffer,
+                                                      uint32_t size, uint32_t &done, uint32_t &error)
+{
+    const int fd = fdOf(handle);
+    done = 0;
+    auto *bytes = static_cast<uint8_t *>(buffer);
+    while (done < size) {
+        const ssize_t n = ::pread(fd, bytes + done, size - done, off_t(position + done));
+        if (n < 0) {
+            if (errno == EINTR)
+                continue;
+            return failedTransfer(fd, position, done, errno, error);
+        }
+        if (n == 0)
+            break;
+        done += uint32_t(n);
+    }
+    if (done == 0 && size != 0 && !reachable(fd, position, error))
+        return TransferResult::PositionFailed;
+    return TransferResult::Done;
+}
+
+IPlatformBackend::TransferResult LinuxBackend::WriteAt(PlatformHandle handle, uint64_t position,
+                                                       const void *buffer, uint32_t size, uint32_t &done,
+                                                       uint32_t &error)
+{
+    const int fd = fdOf(handle);
+    done = 0;
+    const auto *bytes = static_cast<const uint8_t *>(buffer);
+    while (done < size) {
+        const ssize_t n = ::pwrite(fd, bytes + done, size - done, off_t(position + done));
+        if (n < 0) {
+            if (errno == EINTR)
+                continue;
+            return failedTransfer(fd, position, done, errno, error);
+        }
+        if (n == 0)
+            break;
+        done += uint32_t(n);
+    }
+    if (done == 0 && size != 0 && !reachable(fd, position, error))
+        return TransferResult::PositionFailed;
+    return TransferResult::Done;
 }
 
 bool LinuxBackend::GetFileSize(PlatformHandle handle, uint64_t &size, uint32_t &error)

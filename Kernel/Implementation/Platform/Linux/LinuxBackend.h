@@ -22,6 +22,11 @@ public:
     bool Read(PlatformHandle handle, void *buffer, uint32_t size, uint32_t &done, uint32_t &error) override;
     bool Write(PlatformHandle handle, const void *buffer, uint32_t size, uint32_t &done,
                uint32_t &error) override;
+    TransferResult ReadAt(PlatformHandle handle, uint64_t position, void *buffer, uint32_t size,
+                          uint32_t &done, uint32_t &error) override;
+    TransferResult WriteAt(PlatformHandle handle, uint64_t position, const void *buffer, uint32_t size,
+                           uint32_t &done, uint32_t &error) override;
+    bool TransfersKeepPosition() const override { return true; }
     bool GetFileSize(PlatformHandle handle, uint64_t &size, uint32_t &error) override;
     bool SetEndOfFile(PlatformHandle handle, uint32_t &error) override;
     bool DeviceControl(PlatformHandle handle, uint32_t code, const void *in, uint32_t inSize, void *out,
