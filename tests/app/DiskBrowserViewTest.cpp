@@ -23,12 +23,10 @@
 #include "Kernel/Implementation/Root.h"
 
 #include "LogTestUtil.h"
+#include "MemoryVolume.h"
 #include "RecordingDialogs.h"
 #include "ScratchHome.h"
 #include "TestUtil.h"
-
-#include "Kernel/Implementation/FS/Entry.h"
-#include "Kernel/Implementation/FS/Volume.h"
 
 #include <QAbstractItemModelTester>
 #include <QAction>
@@ -45,7 +43,6 @@
 #include <QTreeWidget>
 #include <gtest/gtest.h>
 
-#include <cstring>
 #include <functional>
 #include <iostream>
 #include <memory>
@@ -112,55 +109,17 @@ struct FatImage
     }
 };
 
-// Bytes in memory as the medium of a volume.
-class MemoryStorage : public cStorage
-{
-public:
-    StorageKind GetStorageKind() const override { return StorageKind::Partition; }
-    QString GetDisplayName() const override { return QStringLiteral("memory"); }
-    std::uint64_t GetSize() const override { return 1 << 20; }
-    std::uint32_t GetBytesPerSector() const override { return 512; }
-    std::uint64_t GetTotalSectors() const override { return GetSize() / 512; }
-    bool ReadSectors(std::uint64_t, std::uint32_t count, void *buffer, std::uint32_t &error) override
-    {
-        std::memset(buffer, 0, std::size_t(count) * 512);
-        error = 0;
-        return true;
-    }
-    bool WriteSectors(std::uint64_t, std::uint32_t, const void *, std::uint32_t &error) override
-    {
-        error = 5;
-        return false;
-    }
-    bool ReadBytes(std::uint64_t, std::uint64_t length, void *buffer, std::uint32_t &error) override
-    {
-        std::memset(buffer, 0, std::size_t(length));
-        error = 0;
-        return true;
-    }
-    bool WriteBytes(std::uint64_t, std::uint64_t, const void *, std::uint32_t &error) override
-    {
-        error = 5;
-        return false;
-    }
-};
-
 // A ready volume in memory holding
 //   DOCS/  DOCS/DEEP/  DOCS/DEEP/A.BIN  DOCS/Long File Name.txt  HELLO.TXT  EMPTY.TXT (zero bytes)
 //   SYSTEM.DAT (a system entry)
-struct MediumHolder
-{
-    MemoryStorage medium;
-};
-class FolderVolume : private MediumHolder, public CVolume
+class FolderVolume : public TestVolumes::MemoryVolume
 {
 public:
     // `extra` more files in a folder BULK ("F00000.BIN", ...).
-    explicit FolderVolume(int extra = 0) : CVolume(&medium, description(), nullptr)
+    explicit FolderVolume(int extra = 0)
     {
-        m_kind = static_cast<std::uint32_t>(FileSystemKind::Fat);
         m_label = QStringLiteral("MEMORY");
-        auto root = std::make_unique<CEntry>(this, nullptr, QString(), 0, CEntry::AttrFolder, 0);
+        auto root = newRoot();
         CEntry *docs = add(root.get(), "DOCS", CEntry::AttrFolder, 0);
         CEntry *deep = add(docs, "DEEP", CEntry::AttrFolder, 0);
         add(deep, "A.BIN", 0x20, 4096);
@@ -175,24 +134,6 @@ public:
         }
         SetRootEntry(std::move(root));
     }
-
-private:
-    CEntry *add(CEntry *parent, const QString &name, std::uint32_t attributes, std::uint64_t size)
-    {
-        ++m_index;
-        auto e = std::make_unique<CEntry>(this, parent, name, m_index * 32, attributes, m_index);
-        e->SetSize(size);
-        return parent->AddChild(std::move(e));
-    }
-    static VolumeDescription description()
-    {
-        VolumeDescription d;
-        d.size = 1 << 20;
-        d.ready = 1;
-        d.name = QStringLiteral("memvol");
-        return d;
-    }
-    std::uint64_t m_index = 0;
 };
 
 // The window over a kernel root that holds only the images the test opens.

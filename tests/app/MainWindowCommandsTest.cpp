@@ -17,11 +17,10 @@
 #include "ClientFramework/Views/SmartPane.h"
 #include "ClientFramework/Views/UserPrompts.h"
 #include "ClientFramework/Views/WindowManager.h"
-#include "Kernel/Implementation/FS/Entry.h"
-#include "Kernel/Implementation/FS/Volume.h"
 #include "Kernel/Implementation/Images/ImageOpen.h"
 #include "Kernel/Implementation/Root.h"
 
+#include "MemoryVolume.h"
 #include "RecordingDialogs.h"
 #include "ScratchHome.h"
 #include "TestUtil.h"
@@ -80,80 +79,24 @@ QString makeImage(const QString &dir)
     return disk;
 }
 
-// Zeros in memory as the medium of a volume.
-class MemoryStorage : public cStorage
-{
-public:
-    StorageKind GetStorageKind() const override { return StorageKind::Partition; }
-    QString GetDisplayName() const override { return QStringLiteral("memory"); }
-    std::uint64_t GetSize() const override { return 1 << 20; }
-    std::uint32_t GetBytesPerSector() const override { return 512; }
-    std::uint64_t GetTotalSectors() const override { return GetSize() / 512; }
-    bool ReadSectors(std::uint64_t, std::uint32_t count, void *buffer, std::uint32_t &error) override
-    {
-        std::memset(buffer, 0, std::size_t(count) * 512);
-        error = 0;
-        return true;
-    }
-    bool WriteSectors(std::uint64_t, std::uint32_t, const void *, std::uint32_t &error) override
-    {
-        error = 5;
-        return false;
-    }
-    bool ReadBytes(std::uint64_t, std::uint64_t length, void *buffer, std::uint32_t &error) override
-    {
-        std::memset(buffer, 0, std::size_t(length));
-        error = 0;
-        return true;
-    }
-    bool WriteBytes(std::uint64_t, std::uint64_t, const void *, std::uint32_t &error) override
-    {
-        error = 5;
-        return false;
-    }
-};
-
 // A ready volume in memory: "few" with seven files, "many" and "more" with twenty thousand each.
-struct MediumHolder
-{
-    MemoryStorage medium;
-};
-class FolderVolume : private MediumHolder, public CVolume
+class FolderVolume : public TestVolumes::MemoryVolume
 {
 public:
-    FolderVolume() : CVolume(&medium, description(), nullptr)
+    FolderVolume()
     {
-        m_kind = static_cast<std::uint32_t>(FileSystemKind::Fat);
-        auto root = std::make_unique<CEntry>(this, nullptr, QString(), 0, CEntry::AttrFolder, 0);
-        CEntry *few = add(root.get(), "few", CEntry::AttrFolder);
+        auto root = newRoot();
+        CEntry *few = add(root.get(), "few", CEntry::AttrFolder, 10);
         for (int i = 0; i < FewFiles; ++i)
-            add(few, QString("file%1.txt").arg(i), 0x20);
-        CEntry *many = add(root.get(), "many", CEntry::AttrFolder);
+            add(few, QString("file%1.txt").arg(i), 0x20, 10);
+        CEntry *many = add(root.get(), "many", CEntry::AttrFolder, 10);
         for (int i = 0; i < ManyFiles; ++i)
-            add(many, QString("f%1").arg(i), 0x20);
-        CEntry *more = add(root.get(), "more", CEntry::AttrFolder);
+            add(many, QString("f%1").arg(i), 0x20, 10);
+        CEntry *more = add(root.get(), "more", CEntry::AttrFolder, 10);
         for (int i = 0; i < ManyFiles; ++i)
-            add(more, QString("g%1").arg(i), 0x20);
+            add(more, QString("g%1").arg(i), 0x20, 10);
         SetRootEntry(std::move(root));
     }
-
-private:
-    CEntry *add(CEntry *parent, const QString &name, std::uint32_t attributes)
-    {
-        ++m_index;
-        auto e = std::make_unique<CEntry>(this, parent, name, m_index * 32, attributes, m_index);
-        e->SetSize(10);
-        return parent->AddChild(std::move(e));
-    }
-    static VolumeDescription description()
-    {
-        VolumeDescription d;
-        d.size = 1 << 20;
-        d.ready = 1;
-        d.name = QStringLiteral("memvol");
-        return d;
-    }
-    std::uint64_t m_index = 0;
 };
 
 // The window over a kernel root that holds only the images the test opens.
