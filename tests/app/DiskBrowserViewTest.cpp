@@ -19,13 +19,13 @@
 #include "ClientFramework/Views/DiskExplorerView.h"
 #include "ClientFramework/Views/PropertyPane.h"
 #include "ClientFramework/Views/WindowManager.h"
-#include "Kernel/Implementation/Images/ImageOpen.h"
 #include "Kernel/Implementation/Root.h"
 
 #include "LogTestUtil.h"
 #include "MemoryVolume.h"
 #include "RecordingDialogs.h"
 #include "ScratchHome.h"
+#include "TestMainWindow.h"
 #include "TestUtil.h"
 
 #include <QAbstractItemModelTester>
@@ -43,7 +43,6 @@
 #include <QTreeWidget>
 #include <gtest/gtest.h>
 
-#include <functional>
 #include <iostream>
 #include <memory>
 
@@ -136,59 +135,21 @@ public:
     }
 };
 
-// The window over a kernel root that holds only the images the test opens.
-struct Window
+// The main window with the File Browser's ways to a volume node.
+struct Window : TestMainWindow
 {
-    ScratchHome home;
-    RecordingDialogs dialogs;
-    CRoot root; // never refreshed: no disk of this machine is listed
-    Solution::Commander commander;
-    Solution::MainView view{&commander};
-
-    Window()
-    {
-        view.setKernel(&root);
-        view.setHooks({[this](const QString &path) {
-                           QString problem;
-                           return ImageOpen::OpenImage(&root, path, problem) != nullptr;
-                       },
-                       {}});
-        view.build();
-        view.load(QDomElement());
-    }
-    Framework::WindowManager *windows() const { return view.windowManager(); }
     Framework::DiskBrowserView *browser() const
     {
         return qobject_cast<Framework::DiskBrowserView *>(windows()->view("browser"));
     }
-    Framework::DiskExplorerView *explorer() const
-    {
-        return qobject_cast<Framework::DiskExplorerView *>(windows()->view("explorer"));
-    }
-    bool mount(const QString &image)
-    {
-        return view.mountImage(image) &&
-               QTest::qWaitFor([&] { return view.nodeRoot()->deviceNodes().size() == 1; }, 5000);
-    }
-    // A volume node over a volume in memory, below the computer (the tree owns the node).
-    NodeDrive *addDrive(FolderVolume &volume)
-    {
-        auto *drive = new NodeDrive(&volume);
-        view.nodeRoot()->computer()->appendChild(drive);
-        return drive;
-    }
+    bool mount(const QString &image) { return view.mountImage(image) && waitForDevices(1); }
     // The volume node of the mounted image.
     NodeDrive *drive() const
     {
-        std::function<NodeDrive *(NodeCore *)> find = [&](NodeCore *n) -> NodeDrive * {
-            if (auto *d = dynamic_cast<NodeDrive *>(n); d && d->parent() != view.nodeRoot()->computer())
-                return d;
-            for (NodeCore *c : n->children())
-                if (NodeDrive *d = find(c))
-                    return d;
-            return nullptr;
-        };
-        return find(view.nodeRoot());
+        return dynamic_cast<NodeDrive *>(find([&](NodeCore *n) {
+            auto *d = dynamic_cast<NodeDrive *>(n);
+            return d && d->parent() != view.nodeRoot()->computer();
+        }));
     }
 };
 
@@ -601,7 +562,7 @@ TEST(DiskBrowser, ADiskLeavingUnderAnOpenFolderEmptiesTheView)
     ASSERT_EQ(w.commander.selection(), QList<NodeCore *>({device}));
     ASSERT_EQ(b->currentFolder(), partition);
     w.commander.action("cmdRemove")->trigger();
-    ASSERT_TRUE(QTest::qWaitFor([&] { return w.view.nodeRoot()->deviceNodes().isEmpty(); }, 5000));
+    ASSERT_TRUE(w.waitForDevices(0));
     QApplication::processEvents();
     for (NodeCore *n : b->selectedNodes())
         EXPECT_EQ(n, w.view.nodeRoot()->computer());

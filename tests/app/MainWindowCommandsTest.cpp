@@ -17,12 +17,12 @@
 #include "ClientFramework/Views/SmartPane.h"
 #include "ClientFramework/Views/UserPrompts.h"
 #include "ClientFramework/Views/WindowManager.h"
-#include "Kernel/Implementation/Images/ImageOpen.h"
 #include "Kernel/Implementation/Root.h"
 
 #include "MemoryVolume.h"
 #include "RecordingDialogs.h"
 #include "ScratchHome.h"
+#include "TestMainWindow.h"
 #include "TestUtil.h"
 
 #include <QAction>
@@ -99,49 +99,18 @@ public:
     }
 };
 
-// The window over a kernel root that holds only the images the test opens.
-struct Window
+// The main window with the Disk Explorer open and ways to find and populate its nodes.
+struct Window : TestMainWindow
 {
-    ScratchHome home;
-    RecordingDialogs dialogs;
-    Framework::ScriptedPrompts prompts;
-    CRoot root;
-    Solution::Commander commander;
-    Solution::MainView view{&commander};
-
-    explicit Window(const QDomElement &state = QDomElement())
+    explicit Window(const QDomElement &state = QDomElement()) : TestMainWindow(state)
     {
-        view.setKernel(&root);
-        view.setHooks({[this](const QString &path) {
-                           QString problem;
-                           return ImageOpen::OpenImage(&root, path, problem) != nullptr;
-                       },
-                       {}});
-        view.build();
-        view.load(state);
-        view.windowManager()->openView(Framework::DiskExplorerView::ViewId);
+        windows()->openView(Framework::DiskExplorerView::ViewId);
     }
-    Framework::DiskExplorerView *explorer() const
-    {
-        return qobject_cast<Framework::DiskExplorerView *>(view.windowManager()->view("explorer"));
-    }
-    QAction *action(const char *id) const { return commander.action(QString::fromLatin1(id)); }
     bool mount(const QString &image)
     {
         prompts.files << image;
         action("cmdDI_Mount")->trigger();
-        return QTest::qWaitFor([&] { return view.nodeRoot()->deviceNodes().size() == 1; }, 5000);
-    }
-    NodeCore *find(const std::function<bool(NodeCore *)> &match, NodeCore *from = nullptr) const
-    {
-        if (!from)
-            from = view.nodeRoot();
-        if (match(from))
-            return from;
-        for (NodeCore *c : from->children())
-            if (NodeCore *found = find(match, c))
-                return found;
-        return nullptr;
+        return waitForDevices(1);
     }
     NodeCore *ofKind(NodeKind kind) const
     {
@@ -163,9 +132,7 @@ struct Window
     // A volume node over a volume in memory below the computer, its root folder listed.
     NodeCore *addFolders(FolderVolume &volume)
     {
-        auto *drive = new NodeDrive(&volume);
-        view.nodeRoot()->computer()->appendChild(drive);
-        NodeCore *root = drive->rootFolder();
+        NodeCore *root = addDrive(volume)->rootFolder();
         if (root && !root->isPopulated())
             populateNow(root);
         return root;
@@ -324,7 +291,7 @@ TEST(MainWindowCommands, SmartInfoAndOpenInFileExplorerFollowTheSelection)
     ASSERT_TRUE(w.explorer()->selectNode(device));
     EXPECT_EQ(pane->device(), device);
     w.action("cmdRemove")->trigger();
-    ASSERT_TRUE(QTest::qWaitFor([&] { return w.view.nodeRoot()->deviceNodes().isEmpty(); }, 5000));
+    ASSERT_TRUE(w.waitForDevices(0));
     EXPECT_FALSE(smart->isEnabled());
     EXPECT_FALSE(os->isEnabled());
     EXPECT_EQ(pane->device(), nullptr);

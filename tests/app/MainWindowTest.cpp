@@ -16,11 +16,8 @@
 #include "ClientFramework/Views/UserPrompts.h"
 #include "ClientFramework/Views/WelcomeView.h"
 #include "ClientFramework/Views/WindowManager.h"
-#include "Kernel/Implementation/Images/ImageOpen.h"
-#include "Kernel/Implementation/Root.h"
 
-#include "RecordingDialogs.h"
-#include "ScratchHome.h"
+#include "TestMainWindow.h"
 #include "TestUtil.h"
 
 #include <QAbstractItemModelTester>
@@ -93,32 +90,7 @@ bool haveImageTools()
     return true;
 }
 
-// The window over a kernel root that holds only the images the test opens.
-struct Window
-{
-    ScratchHome home;
-    RecordingDialogs dialogs;
-    Framework::ScriptedPrompts prompts;
-    CRoot root; // never refreshed: no disk of this machine is listed
-    Solution::Commander commander;
-    Solution::MainView view{&commander};
-
-    Window()
-    {
-        view.setKernel(&root);
-        view.setHooks({[this](const QString &path) {
-                           QString problem;
-                           return ImageOpen::OpenImage(&root, path, problem) != nullptr;
-                       },
-                       {}});
-        view.build();
-        view.load(QDomElement());
-    }
-    Framework::DiskExplorerView *explorer() const
-    {
-        return qobject_cast<Framework::DiskExplorerView *>(view.windowManager()->view("explorer"));
-    }
-};
+using Window = TestMainWindow;
 
 QList<QModelIndex> walk(QAbstractItemModel *model, const QModelIndex &parent = {})
 {
@@ -164,7 +136,7 @@ TEST(MainWindow, DiskExplorerShowsAMountedImageAndWalksTheTree)
     w.commander.action("cmdDI_Mount")->trigger();
     ASSERT_EQ(w.view.recentFiles()->files(), QStringList({QFileInfo(image).absoluteFilePath()}));
     EXPECT_TRUE(w.view.recentMenu()->isEnabled());
-    ASSERT_TRUE(QTest::qWaitFor([&] { return w.view.nodeRoot()->deviceNodes().size() == 1; }, 5000));
+    ASSERT_TRUE(w.waitForDevices(1));
 
     // Walk the tree: the computer, the image disk, two partitions, the gap and the volumes.
     QTreeView *tree = explorer->tree();
@@ -232,14 +204,14 @@ TEST(MainWindow, DiskExplorerShowsAMountedImageAndWalksTheTree)
     // "Remove" takes the image out of the tree again.
     explorer->selectNode(device);
     w.commander.action("cmdRemove")->trigger();
-    ASSERT_TRUE(QTest::qWaitFor([&] { return w.view.nodeRoot()->deviceNodes().isEmpty(); }, 5000));
+    ASSERT_TRUE(w.waitForDevices(0));
     EXPECT_TRUE(w.commander.selection().isEmpty());
     EXPECT_TRUE(map->segments().isEmpty() || map->segments().size() == 0);
 
     // Choosing the image from "Recent Disk &Images" mounts it again.
     ASSERT_EQ(w.view.recentMenu()->actions().size(), 1);
     w.view.recentMenu()->actions().first()->trigger();
-    EXPECT_TRUE(QTest::qWaitFor([&] { return w.view.nodeRoot()->deviceNodes().size() == 1; }, 5000));
+    EXPECT_TRUE(w.waitForDevices(1));
 }
 
 TEST(MainWindow, WelcomeViewListsItsCommands)
