@@ -1,8 +1,6 @@
 #include "DiskBrowserView.h"
 
-#include "Commands/Commander.h"
 #include "NodeTree/DiskBrowserModel.h"
-#include "NodeTree/NodeCoreList.h"
 #include "NodeTree/NodeDrive.h"
 #include "NodeTree/NodeFolder.h"
 #include "NodeTree/NodeSortFilterModel.h"
@@ -13,7 +11,6 @@
 #include <QHeaderView>
 #include <QKeyEvent>
 #include <QLabel>
-#include <QMenu>
 #include <QSortFilterProxyModel>
 #include <QSplitter>
 #include <QStyle>
@@ -49,13 +46,6 @@ protected:
     }
 };
 
-// Nodes the tree opens at once so the disks and their volumes are in sight.
-bool expandsAtOnce(const NodeCore *n)
-{
-    return n && (n->kind() == NodeKind::Computer || n->kind() == NodeKind::Device ||
-                 n->kind() == NodeKind::Partition);
-}
-
 // The node whose children stand for a node in the list: a volume lists its root folder.
 NodeCore *listedFolder(NodeCore *n)
 {
@@ -67,15 +57,13 @@ NodeCore *listedFolder(NodeCore *n)
 } // namespace
 
 DiskBrowserView::DiskBrowserView(NodeCore *root, Core::Commander *commander, QWidget *parent)
-    : GenericView(ViewId, tr("File Browser"), parent), m_commander(commander),
-      m_model(new DiskBrowserModel(root, this)), m_filter(new NodeSortFilterModel(this)),
+    : NodeView(ViewId, tr("File Browser"), root, commander,
+               {NodeAttr::Name, NodeAttr::Size, NodeAttr::Kind, NodeAttr::Status}, parent),
       m_folders(new FolderFilter(this)), m_tree(new QTreeView), m_list(new QTreeView),
       m_splitter(new QSplitter(Qt::Horizontal)), m_location(new QLabel), m_up(new QAction(tr("Up"), this))
 {
-    m_model->setColumns({NodeAttr::Name, NodeAttr::Size, NodeAttr::Kind, NodeAttr::Status});
-    m_filter->setSourceModel(m_model);
-    m_filter->sort(0); // folders first, then by name; disks and partitions in the kernel's order
-    m_folders->setSourceModel(m_filter);
+    filterModel()->sort(0); // folders first, then by name; disks and partitions in the kernel's order
+    m_folders->setSourceModel(filterModel());
 
     m_tree->setObjectName(QStringLiteral("browserFolders"));
     m_tree->setModel(m_folders);
@@ -86,7 +74,7 @@ DiskBrowserView::DiskBrowserView(NodeCore *root, Core::Commander *commander, QWi
     m_tree->setContextMenuPolicy(Qt::CustomContextMenu);
 
     m_list->setObjectName(QStringLiteral("browserFiles"));
-    m_list->setModel(m_filter);
+    m_list->setModel(filterModel());
     m_list->setRootIsDecorated(false);
     m_list->setItemsExpandable(false);
     m_list->setExpandsOnDoubleClick(false);
@@ -150,11 +138,11 @@ DiskBrowserView::DiskBrowserView(NodeCore *root, Core::Commander *commander, QWi
         announceSelection();
     });
     // Removed rows leave the selection without a selection signal: announce what is left.
-    connect(m_filter, &QAbstractItemModel::rowsRemoved, this, [this] {
+    connect(filterModel(), &QAbstractItemModel::rowsRemoved, this, [this] {
         updateLocation();
         announceSelection();
     });
-    connect(m_filter, &QAbstractItemModel::modelReset, this, [this] { onTreeCurrentChanged(); });
+    connect(filterModel(), &QAbstractItemModel::modelReset, this, [this] { onTreeCurrentChanged(); });
     connect(m_tree, &QTreeView::activated, this, [this](const QModelIndex &index) {
         NodeCore *n = treeNodeAt(index);
         if (n && n->defaultCommand().isEmpty())
@@ -169,34 +157,8 @@ DiskBrowserView::DiskBrowserView(NodeCore *root, Core::Commander *commander, QWi
             [this](const QPoint &pos) { showContextMenu(m_tree, pos); });
     connect(m_list, &QWidget::customContextMenuRequested, this,
             [this](const QPoint &pos) { showContextMenu(m_list, pos); });
-    // The status bar shows a population until the last one running has ended.
-    connect(m_model, &DiskBrowserModel::populationStarted, this, [this](NodeCore *, const QString &text) {
-        ++m_populating;
-        emit populationStarted(text);
-    });
-    connect(m_model, &DiskBrowserModel::populationFinished, this, [this](NodeCore *, bool cancelled) {
-        m_populating = qMax(0, m_populating - 1);
-        if (m_populating == 0)
-            emit populationFinished(cancelled);
-    });
     m_tree->installEventFilter(this);
     m_list->installEventFilter(this);
-
-    for (NodeSortFilterModel::Filter f : NodeSortFilterModel::allFilters()) {
-        const QString text = NodeSortFilterModel::filterText(f);
-        if (text.isEmpty())
-            continue;
-        auto *a = new QAction(text, this);
-        a->setObjectName(NodeSortFilterModel::filterKey(f));
-        a->setCheckable(true);
-        a->setChecked(m_filter->filter(f));
-        connect(a, &QAction::toggled, this, [this, f](bool on) {
-            m_filter->setFilter(f, on);
-            updateLocation();
-            announceSelection();
-        });
-        m_filterActions << a;
-    }
     updateLocation();
 }
 
@@ -207,10 +169,9 @@ DiskBrowserView::~DiskBrowserView()
     m_list->removeEventFilter(this);
     m_tree->selectionModel()->disconnect(this);
     m_list->selectionModel()->disconnect(this);
-    m_filter->disconnect(this);
+    filterModel()->disconnect(this);
     m_folders->disconnect(this);
-    m_model->disconnect(this);
-    m_model->cancelAll();
+    model()->disconnect(this);
 }
 
 void DiskBrowserView::expandDisks(const QModelIndex &parent)
@@ -228,21 +189,7 @@ NodeCore *DiskBrowserView::treeNodeAt(const QModelIndex &folderIndex) const
 {
     if (!folderIndex.isValid())
         return nullptr;
-    return listNodeAt(m_folders->mapToSource(folderIndex));
-}
-
-NodeCore *DiskBrowserView::listNodeAt(const QModelIndex &filterIndex) const
-{
-    if (!filterIndex.isValid())
-        return nullptr;
-    return m_model->nodeOf(m_filter->mapToSource(filterIndex));
-}
-
-QModelIndex DiskBrowserView::filterIndexOf(const NodeCore *node) const
-{
-    if (!node || node == m_model->rootNode())
-        return {};
-    return m_filter->mapFromSource(m_model->indexOf(node));
+    return nodeAt(m_folders->mapToSource(folderIndex));
 }
 
 QModelIndex DiskBrowserView::folderIndexOf(const NodeCore *node) const
@@ -253,20 +200,12 @@ QModelIndex DiskBrowserView::folderIndexOf(const NodeCore *node) const
 
 QList<NodeCore *> DiskBrowserView::treeSelection() const
 {
-    QList<NodeCore *> nodes;
-    for (const QModelIndex &i : m_tree->selectionModel()->selectedRows(0))
-        if (NodeCore *n = treeNodeAt(i))
-            nodes << n;
-    return nodes;
+    return selectedRowNodes(m_tree, [this](const QModelIndex &i) { return treeNodeAt(i); });
 }
 
 QList<NodeCore *> DiskBrowserView::listSelection() const
 {
-    QList<NodeCore *> nodes;
-    for (const QModelIndex &i : m_list->selectionModel()->selectedRows(0))
-        if (NodeCore *n = listNodeAt(i))
-            nodes << n;
-    return nodes;
+    return selectedRowNodes(m_list, [this](const QModelIndex &i) { return nodeAt(i); });
 }
 
 QList<NodeCore *> DiskBrowserView::selectedNodes() const
@@ -286,17 +225,12 @@ NodeCore *DiskBrowserView::treeNode() const
 
 NodeCore *DiskBrowserView::currentFolder() const
 {
-    return listNodeAt(m_list->rootIndex());
+    return nodeAt(m_list->rootIndex());
 }
 
 void DiskBrowserView::setActivePane(Pane pane)
 {
     m_pane = pane;
-}
-
-void DiskBrowserView::announceSelection()
-{
-    emit nodeSelectionChanged(selectedNodes());
 }
 
 void DiskBrowserView::onTreeCurrentChanged()
@@ -309,7 +243,7 @@ void DiskBrowserView::onTreeCurrentChanged()
     m_list->setRootIndex(folder);
     // Asked even while another view populates the folder: this view takes over if that one stops.
     if (folder.isValid())
-        m_filter->fetchMore(folder);
+        filterModel()->fetchMore(folder);
     m_pane = Pane::Tree;
     updateLocation();
     announceSelection();
@@ -317,7 +251,7 @@ void DiskBrowserView::onTreeCurrentChanged()
 
 void DiskBrowserView::onListActivated(const QModelIndex &index)
 {
-    NodeCore *n = listNodeAt(index);
+    NodeCore *n = nodeAt(index);
     if (!n)
         return;
     // A folder, volume or disk opens in place, as in any file browser; a file runs its command.
@@ -330,7 +264,7 @@ void DiskBrowserView::updateLocation()
 {
     const NodeCore *folder = currentFolder();
     // The tree may be gone already (the model lets go of its root first).
-    const NodeCore *root = m_model->rootNode();
+    const NodeCore *root = model()->rootNode();
     const QString text = folder ? folder->text(NodeAttr::Location)
                          : root ? root->text(NodeAttr::Name)
                                 : QString();
@@ -344,11 +278,7 @@ bool DiskBrowserView::openFolder(NodeCore *node)
     const QModelIndex index = folderIndexOf(node);
     if (!index.isValid())
         return false;
-    for (QModelIndex p = index.parent(); p.isValid(); p = p.parent())
-        m_tree->expand(p);
-    m_tree->selectionModel()->setCurrentIndex(index, QItemSelectionModel::ClearAndSelect |
-                                                         QItemSelectionModel::Rows);
-    m_tree->scrollTo(index);
+    selectRow(m_tree, index);
     // Selecting the node that was current already changes nothing: the list shows it anyway.
     if (currentFolder() != listedFolder(node) && filterIndexOf(listedFolder(node)).isValid())
         onTreeCurrentChanged();
@@ -364,7 +294,7 @@ bool DiskBrowserView::goUp()
     // The root folder and its volume show the same list: step over the volume.
     if (auto *drive = dynamic_cast<NodeDrive *>(p); drive && drive->rootFolder() == n)
         p = p->parent();
-    for (; p && p != m_model->rootNode(); p = p->parent())
+    for (; p && p != model()->rootNode(); p = p->parent())
         if (openFolder(p))
             return true;
     return false;
@@ -372,7 +302,7 @@ bool DiskBrowserView::goUp()
 
 bool DiskBrowserView::browseTo(NodeCore *node)
 {
-    if (!node || node == m_model->rootNode())
+    if (!node || node == model()->rootNode())
         return false;
     NodeCore *file = node->kind() == NodeKind::File ? node : nullptr;
     NodeCore *folder = file ? file->parent() : node;
@@ -409,31 +339,14 @@ void DiskBrowserView::showContextMenu(QTreeView *view, const QPoint &pos)
         m_pane = Pane::Tree;
     }
     announceSelection();
-    if (selectedNodes().isEmpty())
-        return;
-    QMenu menu(this);
-    fillContextMenu(&menu);
-    if (!menu.isEmpty())
-        menu.exec(view->viewport()->mapToGlobal(pos));
-}
-
-void DiskBrowserView::fillContextMenu(QMenu *menu) const
-{
-    const QList<NodeCore *> nodes = selectedNodes();
-    if (nodes.size() == 1)
-        nodes.first()->contextMenu(menu);
-    else if (nodes.size() > 1)
-        NodeCoreList(nodes.cbegin(), nodes.cend()).contextMenu(menu);
+    execContextMenu(view, pos);
 }
 
 bool DiskBrowserView::activate(NodeCore *node)
 {
-    if (!node)
-        return false;
-    const QString id = node->defaultCommand();
-    if (id.isEmpty())
+    if (node && node->defaultCommand().isEmpty())
         return node->kind() != NodeKind::File && openFolder(node);
-    return m_commander && m_commander->execute(id, {node});
+    return NodeView::activate(node);
 }
 
 bool DiskBrowserView::eventFilter(QObject *watched, QEvent *event)
@@ -453,40 +366,32 @@ bool DiskBrowserView::eventFilter(QObject *watched, QEvent *event)
 
 QList<QAction *> DiskBrowserView::widgetActions(Menu menu) const
 {
-    if (menu == ViewMenu) {
-        QList<QAction *> list{m_up, nullptr};
-        return list + m_filterActions;
-    }
-    if (menu == EditMenu && m_commander) {
-        if (QAction *a = m_commander->action(QStringLiteral("cmdNode_SelectAll")))
-            return {a};
-        return {};
-    }
-    if (menu == ActionsMenu && m_commander) {
-        QList<QAction *> list;
-        for (const char *id : {"cmdHex_NodeOpen", "cmdHex_FileRecord", "cmdUpdate", "cmdProperties"})
-            if (QAction *a = m_commander->action(QString::fromLatin1(id)))
-                list << a;
-        return list;
-    }
-    return {};
+    if (menu == ViewMenu)
+        return QList<QAction *>{m_up, nullptr} + filterActions();
+    return NodeView::widgetActions(menu);
+}
+
+QStringList DiskBrowserView::actionCommands() const
+{
+    return {QStringLiteral("cmdHex_NodeOpen"), QStringLiteral("cmdHex_FileRecord"),
+            QStringLiteral("cmdUpdate"), QStringLiteral("cmdProperties")};
+}
+
+void DiskBrowserView::filtersChanged()
+{
+    updateLocation();
+    announceSelection();
 }
 
 void DiskBrowserView::save(QDomElement &element, bool flush)
 {
-    m_filter->save(element, flush);
+    NodeView::save(element, flush);
     element.setAttribute(SplitterAttribute, QString::fromLatin1(m_splitter->saveState().toBase64()));
 }
 
 void DiskBrowserView::load(const QDomElement &element)
 {
-    m_filter->load(element);
-    for (QAction *a : std::as_const(m_filterActions))
-        for (NodeSortFilterModel::Filter f : NodeSortFilterModel::allFilters())
-            if (NodeSortFilterModel::filterKey(f) == a->objectName()) {
-                const QSignalBlocker block(a);
-                a->setChecked(m_filter->filter(f));
-            }
+    NodeView::load(element);
     const QByteArray state = QByteArray::fromBase64(element.attribute(SplitterAttribute).toLatin1());
     if (!state.isEmpty())
         m_splitter->restoreState(state);

@@ -5,26 +5,15 @@
 // from the nodes through the command registry.
 #pragma once
 
-#include "Views/GenericView.h"
-#include "Views/INodeSource.h"
+#include "Views/NodeView.h"
 
-#include <QModelIndex>
-
-class DiskBrowserModel;
-class NodeSortFilterModel;
-class QAction;
 class QLabel;
 class QSortFilterProxyModel;
 class QSplitter;
-class QTreeView;
-
-namespace Core {
-class Commander;
-}
 
 namespace Framework {
 
-class DiskBrowserView : public GenericView, public INodeSource
+class DiskBrowserView : public NodeView
 {
     Q_OBJECT
 public:
@@ -37,9 +26,7 @@ public:
     QTreeView *fileList() const { return m_list; }
     QLabel *locationLabel() const { return m_location; }
     QAction *upAction() const { return m_up; }
-    DiskBrowserModel *model() const { return m_model; }
-    // The filter switches (shared by both panes) and the tree's proxy over them (no files).
-    NodeSortFilterModel *filterModel() const { return m_filter; }
+    // The tree's proxy over the filter switches (shared by both panes): no files.
     QSortFilterProxyModel *folderModel() const { return m_folders; }
 
     // INodeSource: the selection of the pane used last (the tree's when the list has none).
@@ -57,22 +44,17 @@ public:
     bool openFolder(NodeCore *node);
     // Moves the tree's selection to the parent of the current node.
     bool goUp();
-    // The context menu for the current selection.
-    void fillContextMenu(QMenu *menu) const;
     // Double-click or Enter: the node's default command; a node without one opens as a folder.
-    bool activate(NodeCore *node);
+    bool activate(NodeCore *node) override;
 
     QList<QAction *> widgetActions(Menu menu) const override;
     void save(QDomElement &element, bool flush = false) override;
     void load(const QDomElement &element) override;
 
-signals:
-    // A folder population started ("Populating %1"), or the last one running ended.
-    void populationStarted(const QString &text);
-    void populationFinished(bool cancelled);
-
 protected:
     bool eventFilter(QObject *watched, QEvent *event) override;
+    QStringList actionCommands() const override;
+    void filtersChanged() override;
 
 private:
     enum class Pane { Tree, List };
@@ -80,8 +62,6 @@ private:
     // Expands the computer, disks and partitions below a tree index.
     void expandDisks(const QModelIndex &parent);
     NodeCore *treeNodeAt(const QModelIndex &folderIndex) const;
-    NodeCore *listNodeAt(const QModelIndex &filterIndex) const;
-    QModelIndex filterIndexOf(const NodeCore *node) const;
     QModelIndex folderIndexOf(const NodeCore *node) const;
     QList<NodeCore *> treeSelection() const;
     QList<NodeCore *> listSelection() const;
@@ -90,20 +70,14 @@ private:
     void onListActivated(const QModelIndex &index);
     void showContextMenu(QTreeView *view, const QPoint &pos);
     void updateLocation();
-    void announceSelection();
 
-    Core::Commander *m_commander;
-    DiskBrowserModel *m_model;
-    NodeSortFilterModel *m_filter;
     QSortFilterProxyModel *m_folders;
     QTreeView *m_tree;
     QTreeView *m_list;
     QSplitter *m_splitter;
     QLabel *m_location;
     QAction *m_up;
-    QList<QAction *> m_filterActions;
     Pane m_pane = Pane::Tree;
-    int m_populating = 0;
 };
 
 } // namespace Framework

@@ -1,15 +1,11 @@
 #include "DiskExplorerView.h"
 
-#include "Commands/Commander.h"
 #include "NodeTree/DiskBrowserModel.h"
-#include "NodeTree/NodeCoreList.h"
 #include "NodeTree/NodeSortFilterModel.h"
 #include "Views/DeviceMap.h"
 
-#include <QAction>
 #include <QHeaderView>
 #include <QLabel>
-#include <QMenu>
 #include <QScrollArea>
 #include <QSplitter>
 #include <QTreeView>
@@ -18,15 +14,12 @@
 namespace Framework {
 
 DiskExplorerView::DiskExplorerView(NodeCore *root, Core::Commander *commander, QWidget *parent)
-    : GenericView(ViewId, tr("Disk Explorer"), parent), m_root(root), m_commander(commander),
-      m_model(new DiskBrowserModel(root, this)), m_filter(new NodeSortFilterModel(this)),
+    : NodeView(ViewId, tr("Disk Explorer"), root, commander,
+               {NodeAttr::Name, NodeAttr::Kind, NodeAttr::Size, NodeAttr::Status}, parent),
       m_tree(new QTreeView), m_map(new DeviceMap), m_tip(new QLabel)
 {
-    m_model->setColumns({NodeAttr::Name, NodeAttr::Kind, NodeAttr::Size, NodeAttr::Status});
-    m_filter->setSourceModel(m_model);
-
     m_tree->setObjectName(QStringLiteral("explorerTree"));
-    m_tree->setModel(m_filter);
+    m_tree->setModel(filterModel());
     m_tree->setSelectionMode(QAbstractItemView::ExtendedSelection);
     m_tree->setExpandsOnDoubleClick(false);
     m_tree->setUniformRowHeights(true);
@@ -43,7 +36,7 @@ DiskExplorerView::DiskExplorerView(NodeCore *root, Core::Commander *commander, Q
                                         "border-bottom: 1px solid #E0C060; }"));
     m_tip->hide();
 
-    m_map->setRoot(root, m_model);
+    m_map->setRoot(root, model());
     auto *mapScroll = new QScrollArea;
     mapScroll->setObjectName(QStringLiteral("deviceMapArea"));
     mapScroll->setWidgetResizable(true);
@@ -65,17 +58,15 @@ DiskExplorerView::DiskExplorerView(NodeCore *root, Core::Commander *commander, Q
 
     // Disks show their partitions at once; folders wait for expansion.
     m_tree->expandToDepth(1);
-    connect(m_filter, &QAbstractItemModel::rowsInserted, this,
+    connect(filterModel(), &QAbstractItemModel::rowsInserted, this,
             [this](const QModelIndex &parent, int first, int last) {
                 NodeCore *p = nodeAt(parent);
                 if (parent.isValid() && p && p->kind() != NodeKind::Device &&
                     p->kind() != NodeKind::Partition)
                     return;
                 for (int row = first; row <= last; ++row) {
-                    const QModelIndex index = m_filter->index(row, 0, parent);
-                    NodeCore *n = nodeAt(index);
-                    if (n && (n->kind() == NodeKind::Device || n->kind() == NodeKind::Partition ||
-                              n->kind() == NodeKind::Computer))
+                    const QModelIndex index = filterModel()->index(row, 0, parent);
+                    if (expandsAtOnce(nodeAt(index)))
                         m_tree->expand(index);
                 }
             });
@@ -85,93 +76,32 @@ DiskExplorerView::DiskExplorerView(NodeCore *root, Core::Commander *commander, Q
         emit nodeSelectionChanged(nodes);
     });
     // Removed rows leave the selection without a selection signal: announce what is left.
-    connect(m_filter, &QAbstractItemModel::rowsRemoved, this,
-            [this] { emit nodeSelectionChanged(selectedNodes()); });
+    connect(filterModel(), &QAbstractItemModel::rowsRemoved, this, [this] { announceSelection(); });
     connect(m_tree, &QTreeView::activated, this,
             [this](const QModelIndex &index) { activate(nodeAt(index)); });
-    connect(m_tree, &QWidget::customContextMenuRequested, this, [this](const QPoint &pos) {
-        if (selectedNodes().isEmpty())
-            return;
-        QMenu menu(this);
-        fillContextMenu(&menu);
-        if (!menu.isEmpty())
-            menu.exec(m_tree->viewport()->mapToGlobal(pos));
-    });
+    connect(m_tree, &QWidget::customContextMenuRequested, this,
+            [this](const QPoint &pos) { execContextMenu(m_tree, pos); });
     connect(m_map, &DeviceMap::nodeClicked, this, [this](NodeCore *n) { selectNode(n); });
     connect(m_map, &DeviceMap::nodeActivated, this, [this](NodeCore *n) {
         selectNode(n);
         activate(n);
     });
-    connect(m_model, &DiskBrowserModel::populationStarted, this,
-            [this](NodeCore *, const QString &text) { emit populationStarted(text); });
-    connect(m_model, &DiskBrowserModel::populationFinished, this,
-            [this](NodeCore *, bool cancelled) { emit populationFinished(cancelled); });
-
-    for (NodeSortFilterModel::Filter f : NodeSortFilterModel::allFilters()) {
-        const QString text = NodeSortFilterModel::filterText(f);
-        if (text.isEmpty())
-            continue;
-        auto *a = new QAction(text, this);
-        a->setObjectName(NodeSortFilterModel::filterKey(f));
-        a->setCheckable(true);
-        a->setChecked(m_filter->filter(f));
-        connect(a, &QAction::toggled, this, [this, f](bool on) { m_filter->setFilter(f, on); });
-        m_filterActions << a;
-    }
 }
 
-DiskExplorerView::~DiskExplorerView()
-{
-    m_model->cancelAll();
-}
-
-NodeCore *DiskExplorerView::nodeAt(const QModelIndex &proxyIndex) const
-{
-    if (!proxyIndex.isValid())
-        return nullptr;
-    return m_model->nodeOf(m_filter->mapToSource(proxyIndex));
-}
+DiskExplorerView::~DiskExplorerView() = default;
 
 QList<NodeCore *> DiskExplorerView::selectedNodes() const
 {
-    QList<NodeCore *> nodes;
-    for (const QModelIndex &i : m_tree->selectionModel()->selectedRows(0))
-        if (NodeCore *n = nodeAt(i))
-            nodes << n;
-    return nodes;
+    return selectedRowNodes(m_tree, [this](const QModelIndex &i) { return nodeAt(i); });
 }
 
 bool DiskExplorerView::selectNode(NodeCore *node)
 {
-    const QModelIndex source = m_model->indexOf(node);
-    const QModelIndex index = m_filter->mapFromSource(source);
+    const QModelIndex index = filterIndexOf(node);
     if (!index.isValid())
         return false;
-    for (QModelIndex p = index.parent(); p.isValid(); p = p.parent())
-        m_tree->expand(p);
-    m_tree->selectionModel()->setCurrentIndex(index, QItemSelectionModel::ClearAndSelect |
-                                                         QItemSelectionModel::Rows);
-    m_tree->scrollTo(index);
+    selectRow(m_tree, index);
     return true;
-}
-
-void DiskExplorerView::fillContextMenu(QMenu *menu) const
-{
-    const QList<NodeCore *> nodes = selectedNodes();
-    if (nodes.size() == 1)
-        nodes.first()->contextMenu(menu);
-    else if (nodes.size() > 1)
-        NodeCoreList(nodes.cbegin(), nodes.cend()).contextMenu(menu);
-}
-
-bool DiskExplorerView::activate(NodeCore *node)
-{
-    if (!node || !m_commander)
-        return false;
-    const QString id = node->defaultCommand();
-    if (id.isEmpty())
-        return false;
-    return m_commander->execute(id, {node});
 }
 
 void DiskExplorerView::showTip(const QString &tip)
@@ -180,38 +110,9 @@ void DiskExplorerView::showTip(const QString &tip)
     m_tip->setVisible(!tip.isEmpty());
 }
 
-QList<QAction *> DiskExplorerView::widgetActions(Menu menu) const
+QStringList DiskExplorerView::actionCommands() const
 {
-    if (menu == ViewMenu)
-        return m_filterActions;
-    // In the Edit menu, "Select All" has its shortcut only while this view is the active one.
-    if (menu == EditMenu && m_commander)
-        if (QAction *a = m_commander->action(QStringLiteral("cmdNode_SelectAll")))
-            return {a};
-    if (menu == ActionsMenu && m_commander) {
-        QList<QAction *> list;
-        for (const char *id : {"cmdRefresh", "cmdRemove", "cmdProperties"})
-            if (QAction *a = m_commander->action(QString::fromLatin1(id)))
-                list << a;
-        return list;
-    }
-    return {};
-}
-
-void DiskExplorerView::save(QDomElement &element, bool flush)
-{
-    m_filter->save(element, flush);
-}
-
-void DiskExplorerView::load(const QDomElement &element)
-{
-    m_filter->load(element);
-    for (QAction *a : std::as_const(m_filterActions))
-        for (NodeSortFilterModel::Filter f : NodeSortFilterModel::allFilters())
-            if (NodeSortFilterModel::filterKey(f) == a->objectName()) {
-                const QSignalBlocker block(a);
-                a->setChecked(m_filter->filter(f));
-            }
+    return {QStringLiteral("cmdRefresh"), QStringLiteral("cmdRemove"), QStringLiteral("cmdProperties")};
 }
 
 } // namespace Framework
