@@ -1,5 +1,6 @@
 #include "KernelLog.h"
 
+#include "Application.h"
 #include "Log/ApplicationLog.h"
 
 #include "Kernel/Implementation/Platform/PlatformFile.h"
@@ -7,6 +8,7 @@
 #include "Kernel/Implementation/cRoot.h"
 
 #include <QCoreApplication>
+#include <QPointer>
 
 namespace Framework::KernelLog {
 
@@ -22,18 +24,42 @@ QString platformText(const _event_platform &r)
         .arg(systemErrorText(r.error));
 }
 
-void connect(cRoot *root)
+namespace {
+
+void logCondition(const QPointer<Application> &application, const QString &text)
+{
+    if (application)
+        application->logCondition(text);
+    else
+        ApplicationLog::instance().add(text, LogEntry::Warning);
+}
+
+} // namespace
+
+void connect(cRoot *root, Application *application, ConditionTests conditions)
 {
     if (!root)
         return;
     auto &log = ApplicationLog::instance();
+    const QPointer<Application> app(application);
     QObject::connect(
         root, &cRoot::kernelPlatform, &log,
-        [](const _event_platform &r) { ApplicationLog::instance().add(platformText(r), LogEntry::Error); },
+        [app, isCondition = conditions.platform](const _event_platform &r) {
+            const QString text = platformText(r);
+            if (isCondition && isCondition(r))
+                logCondition(app, text);
+            else
+                ApplicationLog::instance().add(text, LogEntry::Error);
+        },
         Qt::QueuedConnection);
     QObject::connect(
         root, &cRoot::kernelInternal, &log,
-        [](const _event_internal &r) { ApplicationLog::instance().add(r.text, LogEntry::Warning); },
+        [app, isCondition = conditions.internal](const _event_internal &r) {
+            if (isCondition && isCondition(r))
+                logCondition(app, r.text);
+            else
+                ApplicationLog::instance().add(r.text, LogEntry::Warning);
+        },
         Qt::QueuedConnection);
     QObject::connect(
         root, &cRoot::kernelDebug, &log,

@@ -1,0 +1,121 @@
+// The kernel's records in the log: what the condition tests pick goes to the application as a
+// condition (a warning that leaves the exit status alone), the rest keeps its weight; with no
+// application left a condition is a plain warning.
+#include "ClientFramework/Application.h"
+#include "ClientFramework/Log/ApplicationLog.h"
+#include "ClientFramework/Log/KernelLog.h"
+#include "Kernel/Implementation/Root.h"
+
+#include "ScratchHome.h"
+
+#include <QApplication>
+#include <QSignalSpy>
+#include <gtest/gtest.h>
+
+#include <memory>
+
+using Framework::ApplicationLog;
+using Framework::LogEntry;
+
+namespace {
+
+// A failed open of a device, and its text in the log.
+_event_platform failedOpen(const QString &device, uint32_t error)
+{
+    return _event_platform{.operation = 1, .name = device, .position = 0, .block = 0, .error = error};
+}
+
+QString textOf(const _event_platform &r)
+{
+    return Framework::KernelLog::platformText(r);
+}
+
+// Conditions of this test: a platform record about "/dev/quiet", a message starting with "quiet".
+bool quietPlatform(const _event_platform &r)
+{
+    return r.name == QLatin1String("/dev/quiet");
+}
+
+bool quietInternal(const _event_internal &r)
+{
+    return r.text.startsWith(QLatin1String("quiet"));
+}
+
+// The entries the log adds while it lives, by text.
+struct Entries
+{
+    Entries()
+    {
+        connection = QObject::connect(
+            &ApplicationLog::instance(), &ApplicationLog::entryAdded,
+            [this](const QString &text, uint32_t attributes) { byText.insert(text, attributes); });
+    }
+    ~Entries() { QObject::disconnect(connection); }
+    QHash<QString, uint32_t> byText;
+    QMetaObject::Connection connection;
+};
+
+} // namespace
+
+TEST(KernelLogConditions, WithoutTestsEveryRecordKeepsItsWeight)
+{
+    ScratchHome home;
+    Framework::Application app(qApp);
+    CRoot root;
+    Framework::KernelLog::connect(&root, &app);
+    Entries entries;
+
+    emit root.kernelPlatform(failedOpen("/dev/quiet", 13));
+    emit root.kernelInternal(_event_internal{"quiet misuse"});
+    emit root.kernelDebug(_event_debug{.file = {}, .line = 0, .level = 1, .text = "a failed step"});
+    emit root.kernelDebug(_event_debug{.file = {}, .line = 0, .level = 3, .text = "an opening trace"});
+    // Queued to the log's thread: nothing is there before the events run.
+    EXPECT_TRUE(entries.byText.isEmpty());
+    QCoreApplication::processEvents();
+
+    ASSERT_EQ(entries.byText.size(), 4);
+    const QString platform = textOf(failedOpen("/dev/quiet", 13));
+    EXPECT_TRUE(entries.byText.value(platform) & LogEntry::Error);
+    EXPECT_TRUE(entries.byText.value("quiet misuse") & LogEntry::Warning);
+    EXPECT_TRUE(entries.byText.value("a failed step") & LogEntry::Error);
+    EXPECT_TRUE(entries.byText.value("an opening trace") & LogEntry::Hidden);
+    EXPECT_FALSE(entries.byText.value("an opening trace") & (LogEntry::Error | LogEntry::Warning));
+    EXPECT_EQ(app.conditionCount(), 0);
+    EXPECT_EQ(app.exitCode(), 1);
+}
+
+TEST(KernelLogConditions, TestedRecordsAreConditionsOfTheApplication)
+{
+    ScratchHome home;
+    auto app = std::make_unique<Framework::Application>(qApp);
+    CRoot root;
+    Framework::KernelLog::connect(&root, app.get(), {&quietPlatform, &quietInternal});
+    Entries entries;
+
+    emit root.kernelPlatform(failedOpen("/dev/quiet", 13));
+    emit root.kernelInternal(_event_internal{"quiet: not ready"});
+    QCoreApplication::processEvents();
+    EXPECT_EQ(app->conditionCount(), 2);
+    EXPECT_EQ(app->exitCode(), 0);
+    const QString quiet = textOf(failedOpen("/dev/quiet", 13));
+    EXPECT_TRUE(entries.byText.value(quiet) & LogEntry::Warning);
+    EXPECT_TRUE(entries.byText.value("quiet: not ready") & LogEntry::Warning);
+
+    // What the tests do not pick keeps its weight.
+    emit root.kernelInternal(_event_internal{"loud misuse"});
+    QCoreApplication::processEvents();
+    EXPECT_EQ(app->conditionCount(), 2);
+    EXPECT_EQ(app->exitCode(), 2);
+    emit root.kernelPlatform(failedOpen("/dev/loud", 13));
+    QCoreApplication::processEvents();
+    EXPECT_EQ(app->exitCode(), 1);
+
+    // Records still on their way when the application goes are plain warnings, not lost.
+    emit root.kernelPlatform(failedOpen("/dev/quiet", 5));
+    app.reset();
+    QCoreApplication::processEvents();
+    const QString late = textOf(failedOpen("/dev/quiet", 5));
+    ASSERT_TRUE(entries.byText.contains(late));
+    EXPECT_TRUE(entries.byText.value(late) & LogEntry::Warning);
+    EXPECT_FALSE(entries.byText.value(late) & LogEntry::Error);
+}
