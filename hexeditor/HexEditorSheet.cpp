@@ -13,7 +13,6 @@
 #include <QFontDatabase>
 #include <QFormLayout>
 #include <QSpinBox>
-#include <QVBoxLayout>
 
 #include <algorithm>
 
@@ -71,13 +70,12 @@ void selectData(QComboBox *box, const QVariant &value)
 } // namespace
 
 HexEditorSheet::HexEditorSheet(std::function<QDomElement()> element, QWidget *parent)
-    : QWidget(parent), m_element(element ? std::move(element) : &HexEditorSheet::settingsElement),
+    : PreferenceSheet(ObjectName, element ? std::move(element) : &HexEditorSheet::settingsElement, parent),
       m_hexOffset(new QCheckBox(tr("&Hexadecimal offsets"), this)), m_wheel(new QSpinBox(this)),
       m_pages(new QSpinBox(this)), m_ascii(new QCheckBox(tr("Show A&SCII column"), this)),
       m_unicode(new QCheckBox(tr("Show &UNICODE column"), this)), m_bytes(new QComboBox(this)),
       m_fontName(new QComboBox(this)), m_fontSize(new QComboBox(this))
 {
-    setObjectName(ObjectName);
     m_hexOffset->setObjectName(QStringLiteral("hexOffset"));
     m_wheel->setObjectName(QStringLiteral("wheelLines"));
     m_pages->setObjectName(QStringLiteral("pages"));
@@ -96,19 +94,14 @@ HexEditorSheet::HexEditorSheet(std::function<QDomElement()> element, QWidget *pa
     for (const SizeChoice &c : FontSizes)
         m_fontSize->addItem(tr(c.text), c.size);
 
-    auto *form = new QFormLayout;
-    form->setFieldGrowthPolicy(QFormLayout::AllNonFixedFieldsGrow);
-    form->addRow(m_hexOffset);
-    form->addRow(tr("Lines to scroll on a &wheel roll:"), m_wheel);
-    form->addRow(tr("&Pages to scroll on a PgUp/PgDown:"), m_pages);
-    form->addRow(m_ascii);
-    form->addRow(m_unicode);
-    form->addRow(tr("&Bytes per line:"), m_bytes);
-    form->addRow(tr("&Font name:"), m_fontName);
-    form->addRow(tr("F&ont size:"), m_fontSize);
-    auto *layout = new QVBoxLayout(this);
-    layout->addLayout(form);
-    layout->addStretch(1);
+    form()->addRow(m_hexOffset);
+    form()->addRow(tr("Lines to scroll on a &wheel roll:"), m_wheel);
+    form()->addRow(tr("&Pages to scroll on a PgUp/PgDown:"), m_pages);
+    form()->addRow(m_ascii);
+    form()->addRow(m_unicode);
+    form()->addRow(tr("&Bytes per line:"), m_bytes);
+    form()->addRow(tr("&Font name:"), m_fontName);
+    form()->addRow(tr("F&ont size:"), m_fontSize);
     showValues(defaults());
 }
 
@@ -198,7 +191,7 @@ void HexEditorSheet::showValues(const Values &v)
 
 void HexEditorSheet::loadSettings()
 {
-    const QDomElement element = m_element();
+    const QDomElement element = settings();
     const QDomElement font = element.firstChildElement(FontElement);
     const QDomElement viewport = element.firstChildElement(ViewportElement);
     Values v = defaults();
@@ -226,7 +219,7 @@ void HexEditorSheet::loadSettings()
 
 void HexEditorSheet::saveSettings()
 {
-    QDomElement element = m_element();
+    QDomElement element = settings();
     if (element.isNull())
         return;
     const Values v = values();

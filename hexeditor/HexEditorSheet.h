@@ -4,10 +4,7 @@
 // element of "views"), and saving applies the values to every open hex editor.
 #pragma once
 
-#include "ClientFramework/Preferences/IPreferencePage.h"
-
-#include <QDomElement>
-#include <QWidget>
+#include "ClientFramework/Preferences/PreferenceSheet.h"
 
 #include <cstdint>
 #include <functional>
@@ -20,7 +17,7 @@ namespace HexEditor {
 
 class EditorCtrl;
 
-class HexEditorSheet : public QWidget, public Framework::IPreferencePage
+class HexEditorSheet : public Framework::PreferenceSheet
 {
     Q_OBJECT
 public:
@@ -58,7 +55,6 @@ public:
     Values values() const;
 
     // Framework::IPreferencePage
-    QWidget *pageWidget() override { return this; }
     QString pageTitle() const override;
     QString pageDescription() const override;
     QIcon pageIcon() const override;
@@ -78,7 +74,6 @@ public:
 private:
     void showValues(const Values &values);
 
-    std::function<QDomElement()> m_element;
     std::function<void(const Values &)> m_applier;
     uint32_t m_storedColumns = 11;
     QCheckBox *m_hexOffset;

@@ -11,7 +11,6 @@
 #include <QLabel>
 #include <QLineEdit>
 #include <QStyle>
-#include <QVBoxLayout>
 
 namespace Framework {
 
@@ -30,15 +29,15 @@ public:
 
 LogSheet::LogSheet(std::function<QDomElement()> element, std::function<void(const QDomElement &)> apply,
                    QWidget *parent)
-    : QWidget(parent), m_element(std::move(element)), m_apply(std::move(apply)),
-      m_detail(new QCheckBox(tr("&Write hidden entries to the log file"), this)),
+    : PreferenceSheet(
+          ObjectName,
+          element ? std::move(element) : [] { return SettingsDocument::instance().element(SettingsElement); },
+          parent),
+      m_apply(std::move(apply)), m_detail(new QCheckBox(tr("&Write hidden entries to the log file"), this)),
       m_createNew(new QCheckBox(tr("Start a &new log file at every start"), this)),
       m_usePattern(new QCheckBox(tr("Name the log file after the &date and time"), this)),
       m_folder(new QLineEdit(this)), m_file(new QLineEdit(this)), m_pattern(new QLineEdit(this))
 {
-    setObjectName(ObjectName);
-    if (!m_element)
-        m_element = [] { return SettingsDocument::instance().element(SettingsElement); };
     if (!m_apply)
         m_apply = [](const QDomElement &e) { ApplicationLog::instance().load(e); };
     m_detail->setObjectName(QStringLiteral("logDetail"));
@@ -50,20 +49,15 @@ LogSheet::LogSheet(std::function<QDomElement()> element, std::function<void(cons
     m_folder->setToolTip(tr("%APPDATA%, %USER%, %TEMP%, %APP% and %CURRENT% stand for their folders"));
     m_pattern->setToolTip(tr("{Date(YYYY-MM-DD)} and {Time(HHmmss)} are replaced when the file is made"));
 
-    auto *form = new QFormLayout;
-    form->setFieldGrowthPolicy(QFormLayout::AllNonFixedFieldsGrow);
-    form->addRow(m_detail);
-    form->addRow(m_createNew);
-    form->addRow(tr("&Folder:"), m_folder);
-    form->addRow(tr("File na&me:"), m_file);
-    form->addRow(m_usePattern);
-    form->addRow(tr("&Pattern:"), m_pattern);
+    form()->addRow(m_detail);
+    form()->addRow(m_createNew);
+    form()->addRow(tr("&Folder:"), m_folder);
+    form()->addRow(tr("File na&me:"), m_file);
+    form()->addRow(m_usePattern);
+    form()->addRow(tr("&Pattern:"), m_pattern);
     auto *note = new QLabel(tr("The folder, the name and a new file take effect at the next start."), this);
     note->setWordWrap(true);
-    auto *layout = new QVBoxLayout(this);
-    layout->addLayout(form);
-    layout->addWidget(note);
-    layout->addStretch(1);
+    addBelowForm(note);
     connect(m_usePattern, &QCheckBox::toggled, this, &LogSheet::updateEnabled);
     restoreDefaults();
 }
@@ -91,7 +85,7 @@ void LogSheet::updateEnabled()
 
 void LogSheet::loadSettings()
 {
-    const QDomElement e = m_element();
+    const QDomElement e = settings();
     bool ok = false;
     const uint32_t attr = e.attribute(QStringLiteral("attr")).toUInt(&ok);
     m_storedOptions = ok ? attr : ApplicationLog::DefaultOptions;
@@ -106,7 +100,7 @@ void LogSheet::loadSettings()
 
 void LogSheet::saveSettings()
 {
-    QDomElement e = m_element();
+    QDomElement e = settings();
     if (e.isNull())
         return;
     uint32_t options = m_storedOptions & ~PageOptions;

@@ -3,10 +3,7 @@
 // folder, name and the new-file switch apply from the next start.
 #pragma once
 
-#include "Preferences/IPreferencePage.h"
-
-#include <QDomElement>
-#include <QWidget>
+#include "Preferences/PreferenceSheet.h"
 
 #include <cstdint>
 #include <functional>
@@ -16,7 +13,7 @@ class QLineEdit;
 
 namespace Framework {
 
-class LogSheet : public QWidget, public IPreferencePage
+class LogSheet : public PreferenceSheet
 {
     Q_OBJECT
 public:
@@ -28,7 +25,6 @@ public:
     explicit LogSheet(std::function<QDomElement()> element = {},
                       std::function<void(const QDomElement &)> apply = {}, QWidget *parent = nullptr);
 
-    QWidget *pageWidget() override { return this; }
     QString pageTitle() const override;
     QString pageDescription() const override;
     QIcon pageIcon() const override;
@@ -46,7 +42,6 @@ public:
 private:
     void updateEnabled();
 
-    std::function<QDomElement()> m_element;
     std::function<void(const QDomElement &)> m_apply;
     uint32_t m_storedOptions = 0;
     QCheckBox *m_detail;
