@@ -142,6 +142,19 @@ struct Window : TestMainWindow
     {
         return qobject_cast<Framework::DiskBrowserView *>(windows()->view("browser"));
     }
+    // "cmdOpen_Browser": the File Browser made or activated.
+    Framework::DiskBrowserView *openBrowser()
+    {
+        commander.action("cmdOpen_Browser")->trigger();
+        return browser();
+    }
+    // The window shown, so the rows have their places for the mouse.
+    bool show(int width, int height)
+    {
+        view.resize(width, height);
+        view.show();
+        return QTest::qWaitForWindowExposed(&view);
+    }
     bool mount(const QString &image) { return view.mountImage(image) && waitForDevices(1); }
     // The volume node of the mounted image.
     NodeDrive *drive() const
@@ -222,6 +235,12 @@ bool waitListed(Framework::DiskBrowserView *b, NodeCore *folder)
                            5000);
 }
 
+// Browses to a volume node and waits until the list shows its root folder.
+bool browseListed(Framework::DiskBrowserView *b, NodeDrive *drive)
+{
+    return b->browseTo(drive) && waitListed(b, drive->rootFolder());
+}
+
 } // namespace
 
 TEST(DiskBrowser, OpensThroughItsCommandsOnce)
@@ -274,8 +293,7 @@ TEST(DiskBrowser, ShowsTheDisksOfAMountedImageAndOpensThemFromTheExplorer)
     FatImage image(dir.path());
     ASSERT_FALSE(image.disk.isEmpty());
     Window w;
-    w.commander.action("cmdOpen_Browser")->trigger();
-    Framework::DiskBrowserView *b = w.browser();
+    Framework::DiskBrowserView *b = w.openBrowser();
     ASSERT_NE(b, nullptr);
     QAbstractItemModelTester sourceTester(b->model(), QAbstractItemModelTester::FailureReportingMode::Fatal);
     QAbstractItemModelTester filterTester(b->filterModel(),
@@ -364,8 +382,7 @@ TEST(DiskBrowser, WalksTheFoldersOfAVolume)
 {
     FolderVolume volume;
     Window w;
-    w.commander.action("cmdOpen_Browser")->trigger();
-    Framework::DiskBrowserView *b = w.browser();
+    Framework::DiskBrowserView *b = w.openBrowser();
     ASSERT_NE(b, nullptr);
     QAbstractItemModelTester sourceTester(b->model(), QAbstractItemModelTester::FailureReportingMode::Fatal);
     QAbstractItemModelTester filterTester(b->filterModel(),
@@ -462,17 +479,13 @@ TEST(DiskBrowser, SelectionDrivesThePropertyPaneAndTheCommands)
         w.commander.setHandler(name, [&ran, &w, name] { ran.append({name, w.commander.selection()}); });
     }
     NodeDrive *drive = w.addDrive(volume);
-    w.commander.action("cmdOpen_Browser")->trigger();
-    Framework::DiskBrowserView *b = w.browser();
+    Framework::DiskBrowserView *b = w.openBrowser();
     ASSERT_NE(b, nullptr);
     auto *pane = qobject_cast<Framework::PropertyPane *>(w.windows()->view("properties"));
     ASSERT_NE(pane, nullptr);
     // Shown, so the rows have their places for the mouse.
-    w.view.resize(1000, 700);
-    w.view.show();
-    ASSERT_TRUE(QTest::qWaitForWindowExposed(&w.view));
-    ASSERT_TRUE(b->browseTo(drive));
-    ASSERT_TRUE(waitListed(b, drive->rootFolder()));
+    ASSERT_TRUE(w.show(1000, 700));
+    ASSERT_TRUE(browseListed(b, drive));
     EXPECT_EQ(w.commander.selection(), QList<NodeCore *>({drive}));
     const QStringList driveGroups = paneGroups(pane);
     EXPECT_FALSE(driveGroups.isEmpty());
@@ -548,8 +561,7 @@ TEST(DiskBrowser, ADiskLeavingUnderAnOpenFolderEmptiesTheView)
     ASSERT_NE(drive, nullptr);
     NodeCore *partition = drive->parent();
     NodeCore *device = partition->parent();
-    w.commander.action("cmdOpen_Browser")->trigger();
-    Framework::DiskBrowserView *b = w.browser();
+    Framework::DiskBrowserView *b = w.openBrowser();
     QAbstractItemModelTester filterTester(b->filterModel(),
                                           QAbstractItemModelTester::FailureReportingMode::Fatal);
     QAbstractItemModelTester folderTester(b->folderModel(),
@@ -588,8 +600,7 @@ TEST(DiskBrowser, ADiskLeavingUnderAnOpenFolderEmptiesTheView)
 TEST(DiskBrowser, KeepsItsFilterSwitchesAndPanes)
 {
     Window w;
-    w.commander.action("cmdOpen_Browser")->trigger();
-    Framework::DiskBrowserView *b = w.browser();
+    Framework::DiskBrowserView *b = w.openBrowser();
     ASSERT_NE(b, nullptr);
     QAction *partitions = nullptr;
     for (QAction *a : b->widgetActions(IWidgetActions::ViewMenu))
@@ -644,8 +655,7 @@ TEST(DiskBrowser, TwoViewsPopulateOneFolderOnce)
     NodeCore *rootFolder = drive->rootFolder();
     Framework::DiskExplorerView *explorer = w.explorer();
     ASSERT_NE(explorer, nullptr);
-    w.commander.action("cmdOpen_Browser")->trigger();
-    Framework::DiskBrowserView *b = w.browser();
+    Framework::DiskBrowserView *b = w.openBrowser();
     ASSERT_NE(b, nullptr);
 
     // The explorer starts the root folder; the browser asks for it before that result arrived.
@@ -728,13 +738,9 @@ TEST(DiskBrowser, ListsAFolderOfTwentyThousandFilesQuickly)
     FolderVolume volume(20000);
     Window w;
     NodeDrive *drive = w.addDrive(volume);
-    w.commander.action("cmdOpen_Browser")->trigger();
-    Framework::DiskBrowserView *b = w.browser();
-    w.view.resize(1100, 700);
-    w.view.show();
-    ASSERT_TRUE(QTest::qWaitForWindowExposed(&w.view));
-    ASSERT_TRUE(b->browseTo(drive));
-    ASSERT_TRUE(waitListed(b, drive->rootFolder()));
+    Framework::DiskBrowserView *b = w.openBrowser();
+    ASSERT_TRUE(w.show(1100, 700));
+    ASSERT_TRUE(browseListed(b, drive));
     NodeCore *bulk = listedByName(b, "BULK");
     ASSERT_NE(bulk, nullptr);
     QElapsedTimer clock;
@@ -762,13 +768,9 @@ TEST(DiskBrowser, Screenshot)
     FolderVolume volume;
     Window w;
     NodeDrive *drive = w.addDrive(volume);
-    w.commander.action("cmdOpen_Browser")->trigger();
-    Framework::DiskBrowserView *b = w.browser();
-    w.view.resize(1100, 700);
-    w.view.show();
-    ASSERT_TRUE(QTest::qWaitForWindowExposed(&w.view));
-    ASSERT_TRUE(b->browseTo(drive));
-    ASSERT_TRUE(waitListed(b, drive->rootFolder()));
+    Framework::DiskBrowserView *b = w.openBrowser();
+    ASSERT_TRUE(w.show(1100, 700));
+    ASSERT_TRUE(browseListed(b, drive));
     NodeCore *docs = listedByName(b, "DOCS");
     ASSERT_TRUE(b->openFolder(docs));
     ASSERT_TRUE(waitListed(b, docs));

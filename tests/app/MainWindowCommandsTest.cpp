@@ -156,6 +156,22 @@ QStringList childNames(NodeCore *folder)
     return names;
 }
 
+// Tests over the image of seven files, made in a folder of their own before each test.
+class MainWindowCommandsOnImage : public ::testing::Test
+{
+protected:
+    void SetUp() override
+    {
+        if (!haveTools())
+            GTEST_SKIP() << "needs truncate, sfdisk, mkfs.vfat, mtools and dd";
+        image = makeImage(dir.path());
+        ASSERT_FALSE(image.isEmpty());
+    }
+
+    QTemporaryDir dir;
+    QString image;
+};
+
 } // namespace
 
 TEST(MainWindowToolbar, BuiltFromTheRegistryWithIconsAndKeptWithTheWindowState)
@@ -242,13 +258,8 @@ TEST(MainWindowFirstStart, TakesAShareOfTheScreenOnceAndRestoresAfterwards)
     EXPECT_EQ(again.view.geometry().topLeft(), QPoint(40, 50));
 }
 
-TEST(MainWindowCommands, SmartInfoAndOpenInFileExplorerFollowTheSelection)
+TEST_F(MainWindowCommandsOnImage, SmartInfoAndOpenInFileExplorerFollowTheSelection)
 {
-    if (!haveTools())
-        GTEST_SKIP() << "needs truncate, sfdisk, mkfs.vfat, mtools and dd";
-    QTemporaryDir dir;
-    const QString image = makeImage(dir.path());
-    ASSERT_FALSE(image.isEmpty());
     Window w;
     ASSERT_TRUE(w.mount(image));
     QAction *smart = w.action("cmdSmartInfo");
@@ -297,13 +308,8 @@ TEST(MainWindowCommands, SmartInfoAndOpenInFileExplorerFollowTheSelection)
     EXPECT_EQ(pane->device(), nullptr);
 }
 
-TEST(MainWindowCommands, ReloadReadsAFolderAndADiskAgain)
+TEST_F(MainWindowCommandsOnImage, ReloadReadsAFolderAndADiskAgain)
 {
-    if (!haveTools())
-        GTEST_SKIP() << "needs truncate, sfdisk, mkfs.vfat, mtools and dd";
-    QTemporaryDir dir;
-    const QString image = makeImage(dir.path());
-    ASSERT_FALSE(image.isEmpty());
     Window w;
     FolderVolume volume;
     ASSERT_NE(w.addFolders(volume), nullptr);
@@ -421,13 +427,8 @@ TEST(MainWindowCommands, StopAndStopAllCancelFolderPopulations)
     EXPECT_FALSE(w.commander.isProcessRunning());
 }
 
-TEST(MainWindowCommands, SelectAllSelectsEveryRowOfTheActiveNodeView)
+TEST_F(MainWindowCommandsOnImage, SelectAllSelectsEveryRowOfTheActiveNodeView)
 {
-    if (!haveTools())
-        GTEST_SKIP() << "needs truncate, sfdisk, mkfs.vfat, mtools and dd";
-    QTemporaryDir dir;
-    const QString image = makeImage(dir.path());
-    ASSERT_FALSE(image.isEmpty());
     Window w;
     ASSERT_TRUE(w.mount(image));
     QAction *selectAll = w.action("cmdNode_SelectAll");

@@ -108,6 +108,16 @@ QString parameter(const QTreeWidget *tree, const QString &label)
     return QStringLiteral("<missing>");
 }
 
+// A pane that asks the provider above for its disks' data.
+class SmartPaneOverProvider : public ::testing::Test
+{
+protected:
+    SmartPaneOverProvider() { pane.setProvider(&provider); }
+
+    FakeProvider provider = makeProvider();
+    SmartPane pane;
+};
+
 } // namespace
 
 TEST(SmartPane, AsksForADiskUntilOneIsSelected)
@@ -155,11 +165,8 @@ TEST(SmartPane, DiskWithoutDataSaysNotSupported)
     EXPECT_EQ(pane.attributeTable()->rowCount(), 0);
 }
 
-TEST(SmartPane, ShowsParametersAndAttributesInIdOrder)
+TEST_F(SmartPaneOverProvider, ShowsParametersAndAttributesInIdOrder)
 {
-    FakeProvider provider = makeProvider();
-    SmartPane pane;
-    pane.setProvider(&provider);
     FakeNode disk(NodeKind::Device, "Disk 0");
     pane.showNodes({&disk});
     EXPECT_EQ(provider.asked, &disk);
@@ -224,11 +231,8 @@ TEST(SmartPane, ShowsParametersAndAttributesInIdOrder)
                 << row << "," << c;
 }
 
-TEST(SmartPane, RefreshReadsAgainAndFollowsTheProvider)
+TEST_F(SmartPaneOverProvider, RefreshReadsAgainAndFollowsTheProvider)
 {
-    FakeProvider provider = makeProvider();
-    SmartPane pane;
-    pane.setProvider(&provider);
     FakeNode disk(NodeKind::Device, "Disk 0");
     pane.showDevice(&disk);
     const int reads = provider.parameterReads;
@@ -253,11 +257,8 @@ TEST(SmartPane, RefreshReadsAgainAndFollowsTheProvider)
     EXPECT_FALSE(pane.attributesMissingLabel()->isHidden());
 }
 
-TEST(SmartPane, DiskThatGoesAwayLeavesTheHint)
+TEST_F(SmartPaneOverProvider, DiskThatGoesAwayLeavesTheHint)
 {
-    FakeProvider provider = makeProvider();
-    SmartPane pane;
-    pane.setProvider(&provider);
     auto disk = std::make_unique<FakeNode>(NodeKind::Device, "Disk 0");
     pane.showNodes({disk.get()});
     ASSERT_EQ(pane.device(), disk.get());
@@ -304,14 +305,11 @@ TEST(SmartText, NamesByIdAndStandardsByMinorVersion)
     EXPECT_EQ(Smart::attributeUpdatedText(0), "Always");
 }
 
-TEST(SmartPane, Screenshot)
+TEST_F(SmartPaneOverProvider, Screenshot)
 {
     const QString out = qEnvironmentVariable("BRINDLE_SCREENSHOT_DIR");
     if (out.isEmpty())
         GTEST_SKIP() << "set BRINDLE_SCREENSHOT_DIR to write the picture";
-    FakeProvider provider = makeProvider();
-    SmartPane pane;
-    pane.setProvider(&provider);
     FakeNode disk(NodeKind::Device, "Disk 0");
     pane.showDevice(&disk);
     pane.resize(760, 640);

@@ -29,6 +29,7 @@
 #include <gtest/gtest.h>
 
 #include <memory>
+#include <ostream>
 
 using HexEditor::HexEditorSheet;
 
@@ -69,6 +70,43 @@ QString anotherFamily()
         if (f != HexEditor::Metrics::defaultFontFamily())
             return f;
     return {};
+}
+
+// What the page's fields show, compared as one.
+struct Fields
+{
+    bool hexOffset;
+    int wheel;
+    int pages;
+    bool ascii;
+    bool unicode;
+    uint bytesPerLine;
+    QString fontName;
+    int fontSize;
+    QString fontSizeText;
+    bool operator==(const Fields &) const = default;
+};
+
+[[maybe_unused]] void PrintTo(const Fields &f, std::ostream *out)
+{
+    *out << f.hexOffset << " " << f.wheel << " " << f.pages << " " << f.ascii << " " << f.unicode << " "
+         << f.bytesPerLine << " " << f.fontName.toStdString() << " " << f.fontSize << " "
+         << f.fontSizeText.toStdString();
+}
+
+Fields fieldsOf(HexEditorSheet &sheet)
+{
+    return {sheet.hexOffsetBox()->isChecked(),   sheet.wheelField()->value(),
+            sheet.pagesField()->value(),         sheet.asciiBox()->isChecked(),
+            sheet.unicodeBox()->isChecked(),     sheet.bytesPerLineList()->currentData().toUInt(),
+            sheet.fontNameList()->currentText(), sheet.fontSizeList()->currentData().toInt(),
+            sheet.fontSizeList()->currentText()};
+}
+
+// The fields of a page over no stored settings.
+Fields defaultFields()
+{
+    return {false, 3, 1, true, false, 16, HexEditor::Metrics::defaultFontFamily(), 11, "Medium"};
 }
 
 } // namespace
@@ -113,14 +151,7 @@ TEST(HexEditorSheet, LoadAndSaveRoundTripKeepsOtherAttributes)
             .arg(family));
     HexEditorSheet sheet(settings.provider());
     sheet.loadSettings();
-    EXPECT_TRUE(sheet.hexOffsetBox()->isChecked());
-    EXPECT_EQ(sheet.wheelField()->value(), 7);
-    EXPECT_EQ(sheet.pagesField()->value(), 2);
-    EXPECT_TRUE(sheet.asciiBox()->isChecked());
-    EXPECT_TRUE(sheet.unicodeBox()->isChecked());
-    EXPECT_EQ(sheet.bytesPerLineList()->currentData().toUInt(), 64u);
-    EXPECT_EQ(sheet.fontNameList()->currentText(), family);
-    EXPECT_EQ(sheet.fontSizeList()->currentText(), "Smallest");
+    EXPECT_EQ(fieldsOf(sheet), (Fields{true, 7, 2, true, true, 64, family, 9, "Smallest"}));
 
     sheet.hexOffsetBox()->setChecked(false);
     sheet.wheelField()->setValue(5);
@@ -142,11 +173,7 @@ TEST(HexEditorSheet, LoadAndSaveRoundTripKeepsOtherAttributes)
     // A second page over the written element shows what the first one saved.
     HexEditorSheet again(settings.provider());
     again.loadSettings();
-    EXPECT_FALSE(again.hexOffsetBox()->isChecked());
-    EXPECT_EQ(again.wheelField()->value(), 5);
-    EXPECT_EQ(again.bytesPerLineList()->currentData().toUInt(), 128u);
-    EXPECT_EQ(again.fontSizeList()->currentData().toInt(), 12);
-    EXPECT_FALSE(again.unicodeBox()->isChecked());
+    EXPECT_EQ(fieldsOf(again), (Fields{false, 5, 3, true, false, 128, family, 12, "Large"}));
 }
 
 TEST(HexEditorSheet, StoredValuesOutsideTheListsSelectTheFirstEntry)
@@ -181,14 +208,7 @@ TEST(HexEditorSheet, MissingSettingsShowTheDefaults)
     SheetDoc settings;
     HexEditorSheet sheet(settings.provider());
     sheet.loadSettings();
-    EXPECT_FALSE(sheet.hexOffsetBox()->isChecked());
-    EXPECT_EQ(sheet.wheelField()->value(), 3);
-    EXPECT_EQ(sheet.pagesField()->value(), 1);
-    EXPECT_TRUE(sheet.asciiBox()->isChecked());
-    EXPECT_FALSE(sheet.unicodeBox()->isChecked());
-    EXPECT_EQ(sheet.bytesPerLineList()->currentData().toUInt(), 16u);
-    EXPECT_EQ(sheet.fontNameList()->currentText(), HexEditor::Metrics::defaultFontFamily());
-    EXPECT_EQ(sheet.fontSizeList()->currentText(), "Medium");
+    EXPECT_EQ(fieldsOf(sheet), defaultFields());
     // Loading writes nothing.
     EXPECT_TRUE(settings.doc.documentElement().firstChildElement().isNull());
 }
@@ -221,14 +241,7 @@ TEST(HexEditorSheet, RestoreDefaultsSetsTheFieldsAndWritesNothingUntilSaved)
     HexEditorSheet sheet(settings.provider());
     sheet.loadSettings();
     sheet.restoreDefaults();
-    EXPECT_FALSE(sheet.hexOffsetBox()->isChecked());
-    EXPECT_EQ(sheet.wheelField()->value(), 3);
-    EXPECT_EQ(sheet.pagesField()->value(), 1);
-    EXPECT_TRUE(sheet.asciiBox()->isChecked());
-    EXPECT_FALSE(sheet.unicodeBox()->isChecked());
-    EXPECT_EQ(sheet.bytesPerLineList()->currentData().toUInt(), 16u);
-    EXPECT_EQ(sheet.fontNameList()->currentText(), HexEditor::Metrics::defaultFontFamily());
-    EXPECT_EQ(sheet.fontSizeList()->currentData().toInt(), 11);
+    EXPECT_EQ(fieldsOf(sheet), defaultFields());
     EXPECT_EQ(settings.viewport("bytes"), "128");
     EXPECT_EQ(settings.viewport("hex-offset"), "true");
 
