@@ -41,19 +41,14 @@ bool quietInternal(const _event_internal &r)
     return r.text.startsWith(QLatin1String("quiet"));
 }
 
-// The entries the log adds while it lives, by text.
-struct Entries
+// The attributes of the entries a spy on the log saw, by text.
+QHash<QString, uint32_t> byText(const QSignalSpy &added)
 {
-    Entries()
-    {
-        connection = QObject::connect(
-            &ApplicationLog::instance(), &ApplicationLog::entryAdded,
-            [this](const QString &text, uint32_t attributes) { byText.insert(text, attributes); });
-    }
-    ~Entries() { QObject::disconnect(connection); }
-    QHash<QString, uint32_t> byText;
-    QMetaObject::Connection connection;
-};
+    QHash<QString, uint32_t> entries;
+    for (const QList<QVariant> &args : added)
+        entries.insert(args[0].toString(), args[1].toUInt());
+    return entries;
+}
 
 } // namespace
 
@@ -63,23 +58,23 @@ TEST(KernelLogConditions, WithoutTestsEveryRecordKeepsItsWeight)
     Framework::Application app(qApp);
     CRoot root;
     Framework::KernelLog::connect(&root, &app);
-    Entries entries;
+    QSignalSpy added(&ApplicationLog::instance(), &ApplicationLog::entryAdded);
 
     emit root.kernelPlatform(failedOpen("/dev/quiet", 13));
     emit root.kernelInternal(_event_internal{"quiet misuse"});
     emit root.kernelDebug(_event_debug{.file = {}, .line = 0, .level = 1, .text = "a failed step"});
     emit root.kernelDebug(_event_debug{.file = {}, .line = 0, .level = 3, .text = "an opening trace"});
     // Queued to the log's thread: nothing is there before the events run.
-    EXPECT_TRUE(entries.byText.isEmpty());
+    EXPECT_TRUE(byText(added).isEmpty());
     QCoreApplication::processEvents();
 
-    ASSERT_EQ(entries.byText.size(), 4);
+    ASSERT_EQ(byText(added).size(), 4);
     const QString platform = textOf(failedOpen("/dev/quiet", 13));
-    EXPECT_TRUE(entries.byText.value(platform) & LogEntry::Error);
-    EXPECT_TRUE(entries.byText.value("quiet misuse") & LogEntry::Warning);
-    EXPECT_TRUE(entries.byText.value("a failed step") & LogEntry::Error);
-    EXPECT_TRUE(entries.byText.value("an opening trace") & LogEntry::Hidden);
-    EXPECT_FALSE(entries.byText.value("an opening trace") & (LogEntry::Error | LogEntry::Warning));
+    EXPECT_TRUE(byText(added).value(platform) & LogEntry::Error);
+    EXPECT_TRUE(byText(added).value("quiet misuse") & LogEntry::Warning);
+    EXPECT_TRUE(byText(added).value("a failed step") & LogEntry::Error);
+    EXPECT_TRUE(byText(added).value("an opening trace") & LogEntry::Hidden);
+    EXPECT_FALSE(byText(added).value("an opening trace") & (LogEntry::Error | LogEntry::Warning));
     EXPECT_EQ(app.conditionCount(), 0);
     EXPECT_EQ(app.exitCode(), 1);
 }
@@ -90,7 +85,7 @@ TEST(KernelLogConditions, TestedRecordsAreConditionsOfTheApplication)
     auto app = std::make_unique<Framework::Application>(qApp);
     CRoot root;
     Framework::KernelLog::connect(&root, app.get(), {&quietPlatform, &quietInternal});
-    Entries entries;
+    QSignalSpy added(&ApplicationLog::instance(), &ApplicationLog::entryAdded);
 
     emit root.kernelPlatform(failedOpen("/dev/quiet", 13));
     emit root.kernelInternal(_event_internal{"quiet: not ready"});
@@ -98,8 +93,8 @@ TEST(KernelLogConditions, TestedRecordsAreConditionsOfTheApplication)
     EXPECT_EQ(app->conditionCount(), 2);
     EXPECT_EQ(app->exitCode(), 0);
     const QString quiet = textOf(failedOpen("/dev/quiet", 13));
-    EXPECT_TRUE(entries.byText.value(quiet) & LogEntry::Warning);
-    EXPECT_TRUE(entries.byText.value("quiet: not ready") & LogEntry::Warning);
+    EXPECT_TRUE(byText(added).value(quiet) & LogEntry::Warning);
+    EXPECT_TRUE(byText(added).value("quiet: not ready") & LogEntry::Warning);
 
     // What the tests do not pick keeps its weight.
     emit root.kernelInternal(_event_internal{"loud misuse"});
@@ -115,7 +110,7 @@ TEST(KernelLogConditions, TestedRecordsAreConditionsOfTheApplication)
     app.reset();
     QCoreApplication::processEvents();
     const QString late = textOf(failedOpen("/dev/quiet", 5));
-    ASSERT_TRUE(entries.byText.contains(late));
-    EXPECT_TRUE(entries.byText.value(late) & LogEntry::Warning);
-    EXPECT_FALSE(entries.byText.value(late) & LogEntry::Error);
+    ASSERT_TRUE(byText(added).contains(late));
+    EXPECT_TRUE(byText(added).value(late) & LogEntry::Warning);
+    EXPECT_FALSE(byText(added).value(late) & LogEntry::Error);
 }
