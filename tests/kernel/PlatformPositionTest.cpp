@@ -131,10 +131,10 @@ TEST_F(PlatformPositionTest, ReadsAtAndPastTheEndOfAFileAreShort)
 TEST_F(PlatformPositionTest, UnalignedBuffersOfEverySizeCarryTheirBytes)
 {
     CPlatformFile file(&root, path, PlatformKind::File);
-    // Growing, shrinking and a size above what the handle keeps between transfers.
+    // Empty, growing, shrinking and a size above what the handle keeps between transfers.
     std::vector<char> storage((2 << 20) + 16, '\0');
     char *unaligned = storage.data() + 1;
-    for (const uint32_t size : {512u, 8192u, 100u, 16384u}) {
+    for (const uint32_t size : {0u, 512u, 8192u, 100u, 16384u}) {
         ASSERT_TRUE(file.Read(777, size, unaligned)) << size;
         EXPECT_EQ(QByteArray(unaligned, int(size)), content.mid(777, int(size))) << size;
     }

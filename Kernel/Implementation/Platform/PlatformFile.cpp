@@ -8,6 +8,7 @@
 
 #include <QMutexLocker>
 
+#include <algorithm>
 #include <cstring>
 #include <map>
 #include <memory>
@@ -329,8 +330,8 @@ IPlatformBackend::TransferResult CPlatformFile::Attempt(IPlatformBackend &backen
         std::unique_ptr<uint8_t[]> large;
         uint8_t *temp;
         if (size <= kKeptBounce) {
-            if (m_bounce.size() < size)
-                m_bounce.resize(size);
+            if (m_bounce.size() < std::max(size, 1u))
+                m_bounce.resize(std::max(size, 1u));
             temp = m_bounce.data();
         } else {
             large.reset(new uint8_t[size]);
