@@ -241,6 +241,21 @@ bool browseListed(Framework::DiskBrowserView *b, NodeDrive *drive)
     return b->browseTo(drive) && waitListed(b, drive->rootFolder());
 }
 
+// Tests over the FAT image above, made in a folder of their own before each test.
+class DiskBrowserOnImage : public ::testing::Test
+{
+protected:
+    void SetUp() override
+    {
+        if (!haveTools())
+            GTEST_SKIP() << "needs truncate, sfdisk, mkfs.vfat, mtools and dd";
+        ASSERT_FALSE(image.disk.isEmpty());
+    }
+
+    QTemporaryDir dir;
+    FatImage image{dir.path()};
+};
+
 } // namespace
 
 TEST(DiskBrowser, OpensThroughItsCommandsOnce)
@@ -285,13 +300,8 @@ TEST(DiskBrowser, OpensThroughItsCommandsOnce)
     EXPECT_EQ(w.windows()->activeView(), browser);
 }
 
-TEST(DiskBrowser, ShowsTheDisksOfAMountedImageAndOpensThemFromTheExplorer)
+TEST_F(DiskBrowserOnImage, ShowsTheDisksOfAMountedImageAndOpensThemFromTheExplorer)
 {
-    if (!haveTools())
-        GTEST_SKIP() << "needs truncate, sfdisk, mkfs.vfat, mtools and dd";
-    QTemporaryDir dir;
-    FatImage image(dir.path());
-    ASSERT_FALSE(image.disk.isEmpty());
     Window w;
     Framework::DiskBrowserView *b = w.openBrowser();
     ASSERT_NE(b, nullptr);
@@ -548,13 +558,8 @@ TEST(DiskBrowser, SelectionDrivesThePropertyPaneAndTheCommands)
     EXPECT_TRUE(paneGroups(pane).contains("Advanced Properties"));
 }
 
-TEST(DiskBrowser, ADiskLeavingUnderAnOpenFolderEmptiesTheView)
+TEST_F(DiskBrowserOnImage, ADiskLeavingUnderAnOpenFolderEmptiesTheView)
 {
-    if (!haveTools())
-        GTEST_SKIP() << "needs truncate, sfdisk, mkfs.vfat, mtools and dd";
-    QTemporaryDir dir;
-    FatImage image(dir.path());
-    ASSERT_FALSE(image.disk.isEmpty());
     Window w;
     ASSERT_TRUE(w.mount(image.disk));
     NodeDrive *drive = w.drive();
