@@ -241,6 +241,19 @@ bool browseListed(Framework::DiskBrowserView *b, NodeDrive *drive)
     return b->browseTo(drive) && waitListed(b, drive->rootFolder());
 }
 
+// The browser's source, filter and folder models under the model tester, fatal at the first fault.
+struct BrowserModelTesters
+{
+    explicit BrowserModelTesters(Framework::DiskBrowserView *b)
+        : source(b->model(), Fatal), filter(b->filterModel(), Fatal), folder(b->folderModel(), Fatal)
+    {
+    }
+    static constexpr auto Fatal = QAbstractItemModelTester::FailureReportingMode::Fatal;
+    QAbstractItemModelTester source;
+    QAbstractItemModelTester filter;
+    QAbstractItemModelTester folder;
+};
+
 // Tests over the FAT image above, made in a folder of their own before each test.
 class DiskBrowserOnImage : public ::testing::Test
 {
@@ -305,11 +318,7 @@ TEST_F(DiskBrowserOnImage, ShowsTheDisksOfAMountedImageAndOpensThemFromTheExplor
     Window w;
     Framework::DiskBrowserView *b = w.openBrowser();
     ASSERT_NE(b, nullptr);
-    QAbstractItemModelTester sourceTester(b->model(), QAbstractItemModelTester::FailureReportingMode::Fatal);
-    QAbstractItemModelTester filterTester(b->filterModel(),
-                                          QAbstractItemModelTester::FailureReportingMode::Fatal);
-    QAbstractItemModelTester folderTester(b->folderModel(),
-                                          QAbstractItemModelTester::FailureReportingMode::Fatal);
+    const BrowserModelTesters testers(b);
     ASSERT_TRUE(w.mount(image.disk));
     NodeDrive *drive = w.drive();
     ASSERT_NE(drive, nullptr);
@@ -394,11 +403,7 @@ TEST(DiskBrowser, WalksTheFoldersOfAVolume)
     Window w;
     Framework::DiskBrowserView *b = w.openBrowser();
     ASSERT_NE(b, nullptr);
-    QAbstractItemModelTester sourceTester(b->model(), QAbstractItemModelTester::FailureReportingMode::Fatal);
-    QAbstractItemModelTester filterTester(b->filterModel(),
-                                          QAbstractItemModelTester::FailureReportingMode::Fatal);
-    QAbstractItemModelTester folderTester(b->folderModel(),
-                                          QAbstractItemModelTester::FailureReportingMode::Fatal);
+    const BrowserModelTesters testers(b);
     QSignalSpy started(b, &Framework::DiskBrowserView::populationStarted);
     NodeDrive *drive = w.addDrive(volume);
     ASSERT_NE(drive->rootFolder(), nullptr);

@@ -208,20 +208,21 @@ TEST_F(SmartPaneOverProvider, ShowsParametersAndAttributesInIdOrder)
     for (int c = 0; c < headers.size(); ++c)
         EXPECT_EQ(t->horizontalHeaderItem(c)->text(), headers[c]);
     ASSERT_EQ(t->rowCount(), 4);
-    EXPECT_EQ(cell(t, 0, 0), "1");
-    EXPECT_EQ(cell(t, 1, 0), "5");
-    EXPECT_EQ(cell(t, 2, 0), "9");
-    EXPECT_EQ(cell(t, 3, 0), "194");
+    // The texts of a column, top to bottom, joined by "|".
+    const auto column = [t](int c) {
+        QStringList texts;
+        for (int row = 0; row < t->rowCount(); ++row)
+            texts << cell(t, row, c);
+        return texts.join('|').toStdString();
+    };
+    EXPECT_EQ(column(0), "1|5|9|194");
     EXPECT_EQ(cell(t, 0, 1), "Read Error Rate");
     EXPECT_EQ(cell(t, 3, 1), "HDA Temperature Celsius");
     EXPECT_EQ(cell(t, 0, 8), QString::number(0xDEADBEEFull));
     // Pre-fail and always updated by default; type 1 is Old-age.
-    EXPECT_EQ(cell(t, 0, 5), "Pre-fail");
-    EXPECT_EQ(cell(t, 3, 5), "Old-age");
-    EXPECT_EQ(cell(t, 0, 6), "Always");
-    EXPECT_EQ(cell(t, 1, 7), "Failing now");
-    EXPECT_EQ(cell(t, 2, 7), "Failed in the past");
-    EXPECT_EQ(cell(t, 3, 7), "Never");
+    EXPECT_EQ(column(5), "Pre-fail|Pre-fail|Old-age|Old-age");
+    EXPECT_EQ(column(6), "Always|Always|Always|Always");
+    EXPECT_EQ(column(7), "Never|Failing now|Failed in the past|Never");
     EXPECT_EQ(cell(t, 2, 2), "100");
     EXPECT_EQ(cell(t, 2, 3), "90");
     EXPECT_EQ(cell(t, 2, 4), "95");
