@@ -61,7 +61,8 @@ SelectorCtrl::SelectorCtrl(QWidget *parent)
 {
     m_tree->header()->hide();
     m_tree->setRootIsDecorated(true);
-    // Qt rejects a rule without a selector; the bare declaration gives the popup the intended plain background.
+    // Qt rejects a rule without a selector; the bare declaration gives the popup
+    // its plain background.
     m_tree->setStyleSheet(QStringLiteral("background: none;"));
     setModel(m_items);
     setView(m_tree);
