@@ -131,6 +131,29 @@ IPlatformBackend::TransferResult failedTransfer(int fd, uint64_t position, uint3
     return IPlatformBackend::TransferResult::TransferFailed;
 }
 
+// Transfers at a position until done, the end or a failure; an interrupted call is repeated. An empty
+// transfer is checked by a seek, so a position past a device's end fails as positioning, as a seek would.
+template <typename Transfer>
+IPlatformBackend::TransferResult transferAt(int fd, uint64_t position, uint32_t size, uint32_t &done,
+                                            uint32_t &error, Transfer transfer)
+{
+    done = 0;
+    while (done < size) {
+        const ssize_t n = transfer(done, size - done, off_t(position + done));
+        if (n < 0) {
+            if (errno == EINTR)
+                continue;
+            return failedTransfer(fd, position, done, errno, error);
+        }
+        if (n == 0)
+            break;
+        done += uint32_t(n);
+    }
+    if (done == 0 && size != 0 && !reachable(fd, position, error))
+        return IPlatformBackend::TransferResult::PositionFailed;
+    return IPlatformBackend::TransferResult::Done;
+}
+
 } // namespace
 
 LinuxBackend::LinuxBackend() = default;
@@ -240,22 +263,11 @@ IPlatformBackend::TransferResult LinuxBackend::ReadAt(PlatformHandle handle, uin
                                                       uint32_t size, uint32_t &done, uint32_t &error)
 {
     const int fd = fdOf(handle);
-    done = 0;
     auto *bytes = static_cast<uint8_t *>(buffer);
-    while (done < size) {
-        const ssize_t n = ::pread(fd, bytes + done, size - done, off_t(position + done));
-        if (n < 0) {
-            if (errno == EINTR)
-                continue;
-            return failedTransfer(fd, position, done, errno, error);
-        }
-        if (n == 0)
-            break;
-        done += uint32_t(n);
-    }
-    if (done == 0 && size != 0 && !reachable(fd, position, error))
-        return TransferResult::PositionFailed;
-    return TransferResult::Done;
+    return transferAt(fd, position, size, done, error,
+                      [fd, bytes](uint32_t at, uint32_t count, off_t offset) {
+                          return ::pread(fd, bytes + at, count, offset);
+                      });
 }
 
 IPlatformBackend::TransferResult LinuxBackend::WriteAt(PlatformHandle handle, uint64_t position,
@@ -263,22 +275,11 @@ IPlatformBackend::TransferResult LinuxBackend::WriteAt(PlatformHandle handle, ui
                                                        uint32_t &error)
 {
     const int fd = fdOf(handle);
-    done = 0;
     const auto *bytes = static_cast<const uint8_t *>(buffer);
-    while (done < size) {
-        const ssize_t n = ::pwrite(fd, bytes + done, size - done, off_t(position + done));
-        if (n < 0) {
-            if (errno == EINTR)
-                continue;
-            return failedTransfer(fd, position, done, errno, error);
-        }
-        if (n == 0)
-            break;
-        done += uint32_t(n);
-    }
-    if (done == 0 && size != 0 && !reachable(fd, position, error))
-        return TransferResult::PositionFailed;
-    return TransferResult::Done;
+    return transferAt(fd, position, size, done, error,
+                      [fd, bytes](uint32_t at, uint32_t count, off_t offset) {
+                          return ::pwrite(fd, bytes + at, count, offset);
+                      });
 }
 
 bool LinuxBackend::GetFileSize(PlatformHandle handle, uint64_t &size, uint32_t &error)
