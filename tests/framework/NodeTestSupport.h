@@ -9,6 +9,7 @@
 #include "Kernel/Implementation/Device.h"
 #include "Kernel/Implementation/FS/Entry.h"
 #include "Kernel/Implementation/FS/Volume.h"
+#include "Kernel/Implementation/Images/ImageMemorySource.h"
 #include "Kernel/Implementation/Images/ImageOpen.h"
 #include "Kernel/Implementation/Root.h"
 
@@ -136,41 +137,15 @@ inline void registerNodeCommands(Core::Commander &commander, const QStringList &
             a->setEnabled(true);
 }
 
-// Bytes in memory as a storage.
-class MemoryStorage : public cStorage
+// Zeroed bytes in memory as a read-only partition.
+class MemoryStorage : public CImageMemorySource
 {
 public:
-    explicit MemoryStorage(std::uint64_t sectors) : m_bytes(qsizetype(sectors * 512), '\0') {}
+    explicit MemoryStorage(std::uint64_t sectors)
+        : CImageMemorySource(QByteArray(qsizetype(sectors * 512), '\0'))
+    {
+    }
     StorageKind GetStorageKind() const override { return StorageKind::Partition; }
-    QString GetDisplayName() const override { return QStringLiteral("memory"); }
-    std::uint64_t GetSize() const override { return std::uint64_t(m_bytes.size()); }
-    std::uint32_t GetBytesPerSector() const override { return 512; }
-    std::uint64_t GetTotalSectors() const override { return GetSize() / 512; }
-    bool ReadSectors(std::uint64_t first, std::uint32_t count, void *buffer, std::uint32_t &error) override
-    {
-        return ReadBytes(first * 512, std::uint64_t(count) * 512, buffer, error);
-    }
-    bool WriteSectors(std::uint64_t, std::uint32_t, const void *, std::uint32_t &error) override
-    {
-        error = 5;
-        return false;
-    }
-    bool ReadBytes(std::uint64_t offset, std::uint64_t length, void *buffer, std::uint32_t &error) override
-    {
-        error = 0;
-        if (offset > GetSize() || length > GetSize() - offset)
-            return false;
-        std::memcpy(buffer, m_bytes.constData() + offset, length);
-        return true;
-    }
-    bool WriteBytes(std::uint64_t, std::uint64_t, const void *, std::uint32_t &error) override
-    {
-        error = 5;
-        return false;
-    }
-
-private:
-    QByteArray m_bytes;
 };
 
 // A ready volume in memory whose root holds `folders` folders of `filesEach` files (the first
