@@ -5,7 +5,6 @@
 #include "ClientFramework/NodeTree/IKernelStorage.h"
 #include "ClientFramework/NodeTree/NodeCore.h"
 #include "ClientFramework/NodeTree/NodeDevice.h"
-#include "ClientFramework/Threads/NodeTagged.h"
 #include "ClientFramework/Views/GenericView.h"
 #include "ClientFramework/Views/UserPrompts.h"
 #include "ClientFramework/Views/WindowManager.h"
@@ -119,10 +118,6 @@ void NodeCommands::onStarted(NodeCore *node)
 {
     if (!node)
         return;
-    if (m_stopWhenStarted.remove(node))
-        for (DiskBrowserModel *m : models())
-            if (Threads::NodeTagged *w = workerOf(m, node))
-                w->cancel(); // before its thread starts: the population ends at once, cancelled
     m_busy.insert(node);
     node->setFlags(NodeState::Busy, true);
     node->notifyChanged();
@@ -131,7 +126,6 @@ void NodeCommands::onStarted(NodeCore *node)
 
 void NodeCommands::onFinished(NodeCore *node)
 {
-    m_stopWhenStarted.remove(node);
     if (!m_busy.remove(node))
         return;
     // Another view may still populate the same folder.
@@ -147,8 +141,6 @@ void NodeCommands::onFinished(NodeCore *node)
 void NodeCommands::prune()
 {
     // Only pointers are compared here: a node whose population was dropped may be gone.
-    for (auto it = m_stopWhenStarted.begin(); it != m_stopWhenStarted.end();)
-        it = anyModelPopulates(*it) ? std::next(it) : m_stopWhenStarted.erase(it);
     bool changed = false;
     for (auto it = m_busy.begin(); it != m_busy.end();) {
         if (anyModelPopulates(*it)) {
@@ -175,39 +167,12 @@ int NodeCommands::stop(const QList<NodeCore *> &nodes)
 {
     int cancelled = 0;
     for (DiskBrowserModel *m : models())
-        for (Threads::NodeTagged *w : m->findChildren<Threads::NodeTagged *>()) {
-            NodeCore *target = w->node();
-            // A worker the model no longer counts has ended or lost its node.
-            if (!target || !m->isPopulating(target) || w->tag().isCancelled())
-                continue;
-            for (NodeCore *n : nodes)
-                if (n && n->isAncestorOf(target)) {
-                    w->cancel();
-                    ++cancelled;
-                    break;
-                }
-        }
-    // A selected folder still waiting for a worker is stopped the moment its worker is made.
-    for (DiskBrowserModel *m : models())
-        for (NodeCore *n : nodes)
-            if (n && m->isPopulating(n) && !workerOf(m, n) && !m_stopWhenStarted.contains(n)) {
-                m_stopWhenStarted.insert(n);
-                ++cancelled;
-            }
+        cancelled += m->cancel(nodes);
     return cancelled;
-}
-
-Threads::NodeTagged *NodeCommands::workerOf(DiskBrowserModel *model, const NodeCore *node)
-{
-    for (Threads::NodeTagged *w : model->findChildren<Threads::NodeTagged *>())
-        if (w->node() == node && !w->tag().isCancelled() && model->isPopulating(node))
-            return w;
-    return nullptr;
 }
 
 void NodeCommands::stopAll()
 {
-    m_stopWhenStarted.clear();
     for (DiskBrowserModel *m : models())
         m->cancelAll();
     prune();

@@ -17,10 +17,6 @@
 class DiskBrowserModel;
 class NodeCore;
 
-namespace Threads {
-class NodeTagged;
-}
-
 namespace Core {
 class Commander;
 }
@@ -48,8 +44,8 @@ public:
     // folder); disks, partitions and volumes through their device; the computer lists every device
     // again. A node below another of the list goes with that one.
     void reload(const QList<NodeCore *> &nodes);
-    // Cancels the populations running on the nodes or below them, and those of the nodes themselves
-    // that wait for a worker; the number cancelled.
+    // Cancels the populations of the nodes and below them in every view, running or waiting for
+    // a worker; the number cancelled.
     int stop(const QList<NodeCore *> &nodes);
     // Cancels every population of every node view.
     void stopAll();
@@ -77,8 +73,6 @@ private:
     void processStateChanged();
     void updateCommands();
     bool anyModelPopulates(const NodeCore *node) const;
-    // The running worker of a node in a model, or nullptr.
-    static Threads::NodeTagged *workerOf(DiskBrowserModel *model, const NodeCore *node);
     QList<DiskBrowserModel *> models() const;
 
     QPointer<Core::Commander> m_commander;
@@ -88,8 +82,6 @@ private:
     QList<QPointer<DiskBrowserModel>> m_models;
     // Folders this object marked Busy while their population runs.
     QSet<NodeCore *> m_busy;
-    // Folders waiting for a worker whose population is to end as soon as it starts.
-    QSet<NodeCore *> m_stopWhenStarted;
 };
 
 } // namespace Solution

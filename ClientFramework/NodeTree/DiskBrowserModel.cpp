@@ -141,6 +141,8 @@ void DiskBrowserModel::startWorker(NodeCore *node)
 {
     auto *worker = new Threads::NodeTagged(node, false, false, this);
     m_workers.append(worker);
+    if (m_cancelOnStart.remove(node))
+        worker->cancel(); // before its thread starts: the population ends at once, cancelled
     connect(worker, &Threads::NodeTagged::populated, this, [this, worker](NodeCore *n, bool cancelled) {
         m_workers.removeOne(worker);
         worker->deleteLater();
@@ -153,11 +155,34 @@ void DiskBrowserModel::startWorker(NodeCore *node)
     worker->start();
 }
 
+int DiskBrowserModel::cancel(const QList<NodeCore *> &nodes)
+{
+    const auto reached = [&nodes](const NodeCore *target) {
+        for (const NodeCore *n : nodes)
+            if (n && n->isAncestorOf(target))
+                return true;
+        return false;
+    };
+    int count = 0;
+    for (Threads::NodeTagged *w : std::as_const(m_workers))
+        if (!w->tag().isCancelled() && reached(w->node())) {
+            w->cancel();
+            ++count;
+        }
+    for (const NodeCore *n : std::as_const(m_queue))
+        if (!m_cancelOnStart.contains(n) && reached(n)) {
+            m_cancelOnStart.insert(n);
+            ++count;
+        }
+    return count;
+}
+
 void DiskBrowserModel::cancelAll()
 {
     for (NodeCore *n : std::as_const(m_queue))
         release(n, this);
     m_queue.clear();
+    m_cancelOnStart.clear();
     const QList<Threads::NodeTagged *> workers = m_workers;
     for (Threads::NodeTagged *w : workers)
         w->cancel();
@@ -200,6 +225,7 @@ void DiskBrowserModel::childrenAboutToBeRemoved(NodeCore *parent, int first, int
         for (qsizetype i = m_queue.size() - 1; i >= 0; --i)
             if (gone && gone->isAncestorOf(m_queue[i])) {
                 release(m_queue[i], this, false);
+                m_cancelOnStart.remove(m_queue[i]);
                 m_queue.removeAt(i);
             }
     }

@@ -6,6 +6,7 @@
 #include "NodeModel.h"
 
 #include <QList>
+#include <QSet>
 
 namespace Threads {
 class NodeTagged;
@@ -28,6 +29,10 @@ public:
     bool isPopulating(const NodeCore *node) const;
     // Cancels every running population and waits for the workers.
     void cancelAll();
+    // Cancels the populations of the nodes and of nodes below them without waiting: a running one
+    // ends cancelled, a queued one ends cancelled as its turn comes. Returns how many it reached
+    // (a population already cancelled is not counted again).
+    int cancel(const QList<NodeCore *> &nodes);
     // Waits until no population is running, delivering their results (tests, shutdown).
     bool waitForPopulations(int timeoutMs = 30000);
 
@@ -47,5 +52,7 @@ private:
 
     QList<Threads::NodeTagged *> m_workers;
     QList<NodeCore *> m_queue;
+    // Queued nodes whose population is cancelled as it starts.
+    QSet<const NodeCore *> m_cancelOnStart;
     bool m_synchronous = false;
 };
