@@ -1,22 +1,18 @@
 #include "OffsetEditCtrl.h"
 
 #include "core/SizeMath.h"
+#include "core/Values.h"
+
+#include <QLocale>
 
 namespace HexEditor::Templates {
 
 namespace {
 
-std::optional<std::uint64_t> number(QString t)
+// A decimal or "0x" hexadecimal number; blanks are ignored.
+std::optional<std::uint64_t> number(const QString &text)
 {
-    t = t.trimmed();
-    t.remove(QLatin1Char(' '));
-    bool ok = false;
-    std::uint64_t v = 0;
-    if (t.startsWith(QLatin1String("0x"), Qt::CaseInsensitive))
-        v = t.mid(2).toULongLong(&ok, 16);
-    else
-        v = t.toULongLong(&ok, 10);
-    return ok ? std::optional<std::uint64_t>(v) : std::nullopt;
+    return Values::parseNumber(text, QLocale::c());
 }
 
 } // namespace
