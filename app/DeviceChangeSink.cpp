@@ -72,15 +72,9 @@ void DeviceChangeSink::repopulate(NodeCore *node)
     if (!d || !d->device())
         return;
     CDevice *device = d->device();
-    if (device->GetDescriptor().sub != 0) {
-        d->refreshState();
-        d->rebuild();
-        return;
-    }
-    const QString path = platformPath(device);
-    m_kernel.RemoveDevice(device);
-    if (!path.isEmpty())
-        m_kernel.RequestAdd(path);
+    // Identified again on the enumeration thread: the same medium keeps its device (and every
+    // view over it) and has its tables read again, a changed one is replaced.
+    m_kernel.RequestDeviceRefresh(device);
 }
 
 void DeviceChangeSink::addDevice(const QString &devicePath)

@@ -16,6 +16,7 @@
 
 #include "ClientFramework/AppIdentity.h"
 #include "ClientFramework/DialogSeam.h"
+#include "ClientFramework/GenericError.h"
 #include "ClientFramework/NodeTree/IKernelStorage.h"
 #include "ClientFramework/NodeTree/IStorageGeometry.h"
 #include "ClientFramework/NodeTree/NodeCore.h"
@@ -25,6 +26,7 @@
 #include "Kernel/Implementation/FS/Volume.h"
 
 #include <QAction>
+#include <QApplication>
 #include <QActionGroup>
 #include <QCloseEvent>
 #include <QDockWidget>
@@ -129,9 +131,21 @@ View::View(NodeCore *node, std::unique_ptr<Storage> storage, bool readOnly, QWid
     setWindowTitle(titleText());
     onEditorStateChanged(m_editor->hexOffset(), m_editor->isReadOnly(), m_editor->isBigEndian());
     updateCommandStates();
+
+    if (m_node) {
+        m_diskName = m_node->text(NodeAttr::Name);
+        for (NodeCore *n = m_node; n; n = n->parent())
+            if (n->kind() == NodeKind::Device)
+                m_diskName = n->text(NodeAttr::Name);
+        m_node->subscribe(this);
+    }
 }
 
-View::~View() = default;
+View::~View()
+{
+    if (m_node)
+        m_node->unsubscribe(this);
+}
 
 QString View::titleText() const
 {
@@ -637,13 +651,44 @@ void View::closeEvent(QCloseEvent *event)
 
 void View::onDeviceRemoved(NodeDevice *device)
 {
-    if (!device || !m_node || !device->isAncestorOf(m_node))
+    if (device && m_node && device->isAncestorOf(m_node))
+        releaseMedium();
+}
+
+void View::publisherDestroyed(NodeCore *node)
+{
+    if (node != m_node)
         return;
-    // The kernel object is going away: nothing may read through the storage any more.
+    // The node took its subscribers with it.
+    m_node = nullptr;
+    releaseMedium();
+}
+
+void View::releaseMedium()
+{
+    if (m_released)
+        return;
+    m_released = true;
+    if (m_node)
+        m_node->unsubscribe(this);
+    m_node = nullptr;
+    const bool lost = m_storage && m_storage->isModified();
+    // A transfer thread reads and writes the object itself: it ends before the object does.
+    m_editor->onThreadStop();
+    if (auto *dock = paneDock(TemplatesPane))
+        if (auto *templates = qobject_cast<Templates::View *>(dock->widget()))
+            templates->setStorage(nullptr);
     m_editor->setStorage(nullptr);
     m_storage.reset();
-    m_node = nullptr;
     updateCommandStates();
+
+    QString text = tr("%1 was removed; its hex editor view is closed.").arg(m_diskName);
+    if (lost)
+        text += QLatin1Char(' ') + tr("Unsaved changes were lost.");
+    // Told once the removal is over: no box opens inside the node tree's update.
+    QMetaObject::invokeMethod(
+        qApp, [text, lost] { GenericError(text, lost ? GenericError::Warning : GenericError::Information).report(); },
+        Qt::QueuedConnection);
     deleteLater();
 }
 

@@ -6,6 +6,7 @@
 
 #include "JumpHistory.h"
 
+#include "ClientFramework/NodeTree/IPublisher.h"
 #include "ClientFramework/Views/GenericView.h"
 
 #include <QHash>
@@ -32,7 +33,7 @@ class StatusCtrl;
 class Storage;
 class ViewActions;
 
-class View : public Framework::GenericView
+class View : public Framework::GenericView, private INodeSubscriber
 {
     Q_OBJECT
 public:
@@ -107,6 +108,7 @@ signals:
     void fileViewModeChanged(int mode);
 
 public slots:
+    // The device leaves: a view over it or anything on it lets go of its storage and closes.
     void onDeviceRemoved(NodeDevice *device);
     void onEditorStateChanged(bool isHexOffset, bool isReadOnly, bool isBigEndian);
     void onSelectColumns();
@@ -115,6 +117,12 @@ protected:
     void closeEvent(QCloseEvent *event) override;
 
 private:
+    // INodeSubscriber: the node shown is destroyed (its device left, or its partition was
+    // replaced by a new layout), and with it the kernel object read.
+    void publisherDestroyed(NodeCore *node) override;
+    // Stops everything that reads the kernel object, drops the storage, tells the user whether
+    // unsaved edits were lost, and closes the view. Nothing reads the medium afterwards.
+    void releaseMedium();
     void buildActions();
     void buildToolBar();
     void buildCustomizeMenu();
@@ -126,6 +134,9 @@ private:
     QString titleText() const;
 
     NodeCore *m_node;
+    // The disk the node lies on, named for the message when it leaves.
+    QString m_diskName;
+    bool m_released = false;
     std::unique_ptr<Storage> m_storage;
     EditorCtrl *m_editor = nullptr;
     StatusCtrl *m_status = nullptr;

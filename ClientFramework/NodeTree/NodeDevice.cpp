@@ -92,17 +92,32 @@ void NodeDevice::refreshState()
 
 void NodeDevice::rebuild()
 {
-    clearChildren();
-    if (!m_device || !isReady())
+    // The kernel objects the children stand for: the partitions, or the whole-device volume.
+    QList<const cStorage *> wanted;
+    if (m_device && isReady()) {
+        const std::uint32_t count = m_device->GetPartitionCount();
+        for (std::uint32_t i = 0; i < count; ++i)
+            if (CPartition *p = m_device->GetPartition(i))
+                wanted.append(p);
+        if (count == 0)
+            if (CVolume *v = VolumeSource::volumeOf(m_device))
+                wanted.append(v);
+    }
+    // The same objects keep their nodes, and with them whatever shows or selects those nodes.
+    QList<const cStorage *> held;
+    for (NodeCore *c : children())
+        if (auto *k = dynamic_cast<IKernelStorage *>(c))
+            held.append(k->kernelStorage());
+    if (isPopulated() && held == wanted)
         return;
-    const std::uint32_t count = m_device->GetPartitionCount();
-    for (std::uint32_t i = 0; i < count; ++i)
-        if (CPartition *p = m_device->GetPartition(i))
-            appendChild(new NodePartition(p, int(i), this));
-    if (count == 0)
-        if (CVolume *v = VolumeSource::volumeOf(m_device))
-            appendChild(new NodeDrive(v, this));
-    setFlags(NodeState::Populated);
+    clearChildren();
+    for (int i = 0; i < wanted.size(); ++i) {
+        if (wanted.size() == 1 && m_device->GetPartitionCount() == 0)
+            appendChild(new NodeDrive(VolumeSource::volumeOf(m_device), this));
+        else
+            appendChild(new NodePartition(m_device->GetPartition(std::uint32_t(i)), i, this));
+    }
+    setFlags(NodeState::Populated, m_device && isReady());
 }
 
 QString NodeDevice::biosNumber() const

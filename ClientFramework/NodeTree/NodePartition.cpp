@@ -132,7 +132,8 @@ QString NodePartition::key() const
 {
     const std::uint32_t kind = m_partition ? m_partition->GetKind() : 0;
     const std::uint64_t start = m_partition ? m_partition->GetStart() : 0;
-    return QStringLiteral("part-%1-%2-%3").arg(kind).arg(m_position).arg(start);
+    // Kind and first sector: the key survives a refresh that renumbers the table's rows.
+    return QStringLiteral("part-%1-%2").arg(kind).arg(start);
 }
 
 QString NodePartition::kindText() const

@@ -89,8 +89,9 @@ bool NodeRoot::removeDevice(const CDevice *device)
     for (int row = 0; row < childCount(); ++row) {
         NodeCore *c = child(row);
         if (c->kind() == NodeKind::Device && static_cast<NodeDevice *>(c)->device() == device) {
+            // Listeners let go of the node, and of what they read through it, while both stand.
+            emit deviceRemoved(static_cast<NodeDevice *>(c));
             removeChild(row);
-            emit deviceRemoved(device);
             return true;
         }
     }

@@ -37,7 +37,7 @@ public:
     // Adds a node for a listed kernel device that has none yet (returns it, or null).
     NodeDevice *addDevice(CDevice *device);
     // Removes and destroys the node of a device (the device itself may already be gone: only
-    // the pointer is compared).
+    // the pointer is compared). deviceRemoved goes out first, while the node still stands.
     bool removeDevice(const CDevice *device);
     // Brings the device nodes in line with the kernel's device list.
     void synchronize();
@@ -50,7 +50,8 @@ public slots:
 
 signals:
     void deviceAdded(NodeDevice *node);
-    void deviceRemoved(const CDevice *device);
+    // The node of a leaving device, about to be destroyed with every node below it.
+    void deviceRemoved(NodeDevice *node);
     // A device could not be opened (permissions): the tip text to show.
     void notReadyTip(const QString &tip);
 

@@ -95,6 +95,89 @@ void CDevice::CreateVolumes()
         CreatePartitionVolumes(*p, options);
 }
 
+DeviceLayout::~DeviceLayout()
+{
+    // Volumes read through partitions, partitions through the device.
+    volume.reset();
+    partitions.clear();
+}
+
+std::unique_ptr<DeviceLayout> CDevice::ScanLayout(const DeviceInfo &fresh)
+{
+    auto layout = std::make_unique<DeviceLayout>();
+    DeviceInfo facts = m_info;
+    facts.partStyle = fresh.partStyle;
+    facts.volumes = fresh.volumes;
+    PartScan::Result result = PartScan::ScanDevice(*this, facts, m_root);
+    layout->partStyle = result.partStyle;
+    layout->diskSignature = result.diskSignature;
+    layout->volumes = fresh.volumes;
+    layout->partitions = std::move(result.partitions);
+    if (layout->partStyle == PartStyle::VirtualManager)
+        return layout;
+    VolumeCreate::Options options;
+    options.root = m_root;
+    if (layout->partitions.empty())
+        layout->volume = VolumeCreate::CreateVolume(*this, m_info.mediaType, options);
+    for (const auto &p : layout->partitions)
+        CreatePartitionVolumes(*p, options);
+    return layout;
+}
+
+namespace {
+
+bool SameVolume(const CVolume *a, const CVolume *b)
+{
+    if (!a || !b)
+        return a == b;
+    return a->GetKind() == b->GetKind() && a->GetLabel() == b->GetLabel() &&
+           a->GetSerialNumber() == b->GetSerialNumber() && a->GetTotalSectors() == b->GetTotalSectors();
+}
+
+bool SamePartition(const CPartition &a, const CPartition &b)
+{
+    if (a.GetKind() != b.GetKind() || a.GetStart() != b.GetStart() || a.GetLength() != b.GetLength() ||
+        a.GetActive() != b.GetActive() || a.GetTableSector() != b.GetTableSector() ||
+        a.GetEntry() != b.GetEntry() || a.IsGptEntry() != b.IsGptEntry() ||
+        a.GetGpt().typeGuid != b.GetGpt().typeGuid || a.GetGpt().uniqueGuid != b.GetGpt().uniqueGuid ||
+        a.GetGpt().attributes != b.GetGpt().attributes || a.GetGpt().name != b.GetGpt().name ||
+        a.GetChildCount() != b.GetChildCount() || !SameVolume(a.Volume(), b.Volume()))
+        return false;
+    for (std::uint32_t i = 0; i < a.GetChildCount(); ++i)
+        if (!SamePartition(*a.GetChildPartition(i), *b.GetChildPartition(i)))
+            return false;
+    return true;
+}
+
+} // namespace
+
+bool CDevice::HasLayout(const DeviceLayout &layout) const
+{
+    if (layout.partStyle != m_info.partStyle || layout.diskSignature != m_diskSignature ||
+        layout.partitions.size() != m_partitions.size() || !SameVolume(layout.volume.get(), m_volume.get()))
+        return false;
+    for (std::size_t i = 0; i < m_partitions.size(); ++i)
+        if (!SamePartition(*m_partitions[i], *layout.partitions[i]))
+            return false;
+    return true;
+}
+
+std::unique_ptr<DeviceLayout> CDevice::SwapLayout(std::unique_ptr<DeviceLayout> layout)
+{
+    auto previous = std::make_unique<DeviceLayout>();
+    previous->partStyle = m_info.partStyle;
+    previous->diskSignature = m_diskSignature;
+    previous->volumes = m_info.volumes;
+    previous->partitions = std::move(m_partitions);
+    previous->volume = std::move(m_volume);
+    m_info.partStyle = layout->partStyle;
+    m_diskSignature = layout->diskSignature;
+    m_info.volumes = layout->volumes;
+    m_partitions = std::move(layout->partitions);
+    m_volume = std::move(layout->volume);
+    return previous;
+}
+
 void CDevice::ForEachVolume(const std::function<void(CPartition *, CVolume *)> &visit) const
 {
     if (m_volume)

@@ -26,6 +26,18 @@ class CPlatformFile;
 class cVirtualSource;
 class CVolume;
 
+// A partition layout read from a device: the style, the top-level partitions with their volumes,
+// or the volume over the whole device when there are none.
+struct DeviceLayout
+{
+    PartStyle partStyle = PartStyle::Raw;
+    std::uint32_t diskSignature = 0;
+    QList<VolumeInfo> volumes;
+    std::vector<std::unique_ptr<CPartition>> partitions;
+    std::unique_ptr<CVolume> volume;
+    ~DeviceLayout();
+};
+
 class CDevice : public cDevice
 {
 public:
@@ -92,11 +104,22 @@ public:
 
     // The volume over the whole device when it has no partitions (a disk or image without a
     // table, a dynamic volume); null when it has partitions, whose volumes they own
-    // (`CPartition::Volume`). Made at construction, never replaced, destroyed first.
+    // (`CPartition::Volume`). Made at construction, replaced only with the whole layout
+    // (SwapLayout), destroyed first.
     CVolume *Volume() const { return m_volume.get(); }
     // Every volume of the device with the partition it lies on (null for the whole-device one):
     // the whole-device volume, then the partitions' in table order, children after their parent.
     void ForEachVolume(const std::function<void(CPartition *, CVolume *)> &visit) const;
+
+    // Reads the partition tables and volumes again (reads only; the device's own layout is
+    // untouched), with the platform facts of `fresh` (its partition style and mounted volumes).
+    std::unique_ptr<DeviceLayout> ScanLayout(const DeviceInfo &fresh);
+    // Whether `layout` describes what the device holds: style, signature, and for every partition
+    // its kind, place, entry, children and the kind, label and serial of its volume.
+    bool HasLayout(const DeviceLayout &layout) const;
+    // Puts `layout` in place of the device's partitions and volume and gives back the previous ones,
+    // which the caller destroys once nothing refers to them any more.
+    std::unique_ptr<DeviceLayout> SwapLayout(std::unique_ptr<DeviceLayout> layout);
 
     // The top-level partitions, filled by the partition scan at construction.
     std::vector<std::unique_ptr<CPartition>> &Partitions() { return m_partitions; }

@@ -39,7 +39,8 @@ struct _event_platform
 };
 
 // Storage events: 0 enumeration started (null device), 1 device added, 2 change started,
-// 3 change completed, 4 device removed, 5 enumeration completed (null device).
+// 3 change completed, 4 device removed, 5 enumeration completed (null device). Event 3 with flag 1:
+// the device stayed but its partitions and volumes were replaced by a new layout read from it.
 struct _event_storage
 {
     enum Code : uint32_t {
@@ -60,7 +61,8 @@ struct _event_storage
 // then the partitions' in table order, a partition's children after it), code 4 for each of them
 // right before the device's event 4. The device builds and owns its volumes before it is listed and
 // destroys them with itself, so a volume stays valid until its code 4 has been delivered; after that
-// it must not be used. `partition` is null for the volume over a whole device without partitions.
+// it must not be used. A layout replaced in place sends code 4 for the old volumes before its event 3
+// and code 1 for the new ones after it. `partition` is null for the volume over a whole device without partitions.
 struct _event_volume
 {
     enum Code : uint32_t {

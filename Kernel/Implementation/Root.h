@@ -16,6 +16,7 @@
 #include <memory>
 
 class CDevice;
+struct DeviceLayout;
 class Thread_Init;
 class IEnumerationSource;
 
@@ -94,7 +95,8 @@ public:
     // Queues a path to be identified and added on the enumeration thread (started when idle).
     bool RequestAdd(const QString &path);
     // Queues a known device to be identified again on the enumeration thread: events 2 and 3
-    // around it, and a device whose medium or geometry changed is replaced (events 4 and 1).
+    // around it, and a device whose medium or geometry changed is replaced (events 4 and 1); the
+    // same medium (or an image) keeps its device and has its partition tables read again.
     bool RequestDeviceRefresh(CDevice *device);
 
     // The number of the first assembled dynamic volume (physical drive numbers stay below it).
@@ -142,8 +144,17 @@ protected:
     // One refresh pass (run by the enumeration thread): close all handles, enumerate, remove what
     // vanished or is excluded, add what appeared; events 0 and 5 around it.
     void RunRefresh(bool full, const RefreshKinds &kinds);
-    // Identifies a known device again; one whose medium or geometry changed is replaced.
+    // Identifies a known device again; one whose medium or geometry changed is replaced. The same
+    // medium keeps its device; its partition tables are read again and a changed layout replaces
+    // the partitions and volumes in place (ReplaceLayout).
     void RunDeviceRefresh(CDevice *device);
+    // Reads the device's tables again with the platform facts of `fresh`; a layout other than the
+    // one it holds replaces it (ReplaceLayout), otherwise event 3 alone goes out.
+    void RefreshLayout(CDevice *device, const DeviceInfo &fresh);
+    // On the root's thread, in one delivery: the device's volumes leave (code 4), the layout is
+    // swapped in, event 3 with flag 1 goes out, the new volumes arrive (code 1), and the previous
+    // partitions and volumes are destroyed after every listener has let go of them.
+    void ReplaceLayout(CDevice *device, std::unique_ptr<DeviceLayout> layout);
     // Whether a refresh with these kinds keeps a device (kept) or adds a descriptor (!kept).
     static bool IsIncluded(const DeviceInfo &info, bool full, const RefreshKinds &kinds, bool kept);
     // Whether a fresh descriptor describes the same medium as a known device.

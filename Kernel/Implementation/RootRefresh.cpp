@@ -8,6 +8,7 @@
 #include "RootEnumerate.h"
 
 #include <QMutexLocker>
+#include <QThread>
 
 bool CRoot::IsIncluded(const DeviceInfo &info, bool full, const RefreshKinds &kinds, bool kept)
 {
@@ -109,11 +110,18 @@ void CRoot::RunDeviceRefresh(CDevice *device)
     if (!Devices().contains(device))
         return;
     const DeviceInfo &known = device->GetDescriptor();
-    if (known.sub != 0)
+    if (known.sub != 0) {
+        // An image has no platform identity to check: its tables are read again.
+        StorageEvent(device, _event_storage::ChangeStarted);
+        RefreshLayout(device, known);
         return;
+    }
     EnumCandidate candidate;
-    if (!m_source->Resolve(DevicePath(device), candidate))
+    if (!m_source->Resolve(DevicePath(device), candidate)) {
+        // The listing no longer names it (unplugged, a loop device detached): the device left.
+        TakeDevice(device);
         return;
+    }
     StorageEvent(device, _event_storage::ChangeStarted);
     device->Close(true);
     CEnumerator enumerator(this, *m_source);
@@ -121,7 +129,8 @@ void CRoot::RunDeviceRefresh(CDevice *device)
     bool found = enumerator.IdentifyWithVolumes(candidate, fresh);
     if (found && SameMedium(known, fresh)) {
         delete fresh.handle;
-        StorageEvent(device, _event_storage::ChangeCompleted);
+        // The same medium: the device, and everything that shows it, stays.
+        RefreshLayout(device, fresh);
         return;
     }
     StorageEvent(device, _event_storage::ChangeCompleted);
@@ -135,4 +144,43 @@ void CRoot::RunDeviceRefresh(CDevice *device)
     } else if (found) {
         delete fresh.handle;
     }
+}
+
+void CRoot::RefreshLayout(CDevice *device, const DeviceInfo &fresh)
+{
+    // A table written meanwhile brings its partitions in place of the old ones.
+    std::unique_ptr<DeviceLayout> layout;
+    if (device->GetDescriptor().partStyle != PartStyle::VirtualManager)
+        layout = device->ScanLayout(fresh);
+    if (layout && !device->HasLayout(*layout))
+        ReplaceLayout(device, std::move(layout));
+    else
+        StorageEvent(device, _event_storage::ChangeCompleted);
+}
+
+void CRoot::ReplaceLayout(CDevice *device, std::unique_ptr<DeviceLayout> layout)
+{
+    auto pending = std::make_shared<std::unique_ptr<DeviceLayout>>(std::move(layout));
+    auto apply = [this, device, pending] {
+        // A device taken out meanwhile keeps its old layout; the new one goes with `pending`.
+        if (!Devices().contains(device) || !IsAnnounced(device))
+            return;
+        auto volumes = [device](uint32_t code) {
+            QList<_event_volume> list;
+            device->ForEachVolume([&list, device, code](CPartition *partition, CVolume *volume) {
+                list.append(_event_volume{device, partition, volume, code});
+            });
+            return list;
+        };
+        for (const _event_volume &v : volumes(_event_volume::VolumeRemoved))
+            emit kernelVolume(v);
+        const std::unique_ptr<DeviceLayout> previous = device->SwapLayout(std::move(*pending));
+        emit kernelStorage(_event_storage{device, _event_storage::ChangeCompleted, 1});
+        for (const _event_volume &v : volumes(_event_volume::VolumeAdded))
+            emit kernelVolume(v);
+    };
+    if (QThread::currentThread() == thread())
+        apply();
+    else
+        QMetaObject::invokeMethod(this, apply, Qt::QueuedConnection);
 }
