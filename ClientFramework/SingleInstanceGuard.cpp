@@ -1,6 +1,21 @@
 #include "SingleInstanceGuard.h"
 
+#include <QCryptographicHash>
+#include <QDir>
+
 namespace Framework {
+
+QString SingleInstanceGuard::userKey(const QString &base, const QProcessEnvironment &environment)
+{
+    QString folder = environment.value(QStringLiteral("XDG_CONFIG_HOME"));
+    if (folder.isEmpty() && !environment.value(QStringLiteral("HOME")).isEmpty())
+        folder = environment.value(QStringLiteral("HOME")) + QStringLiteral("/.config");
+    if (folder.isEmpty())
+        return base;
+    const QByteArray hash = QCryptographicHash::hash(QDir::cleanPath(QDir(folder).absolutePath()).toUtf8(),
+                                                     QCryptographicHash::Sha1);
+    return base + QLatin1Char('-') + QString::fromLatin1(hash.toHex().left(16));
+}
 
 SingleInstanceGuard::SingleInstanceGuard(const QString &key) : m_memory(key) {}
 

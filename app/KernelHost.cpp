@@ -65,10 +65,13 @@ KernelHost::~KernelHost()
 bool KernelHost::saveHardwareInfo(const QString &fileName)
 {
     auto &log = Framework::ApplicationLog::instance();
-    m_root.RefreshAndWait(true);
+    // The report describes the devices the tree shows: they are enumerated only when nothing has
+    // been yet (a full refresh would drop and add every disk under the open views).
+    if (!m_root.HasRefreshed())
+        m_root.RefreshAndWait(false);
     const QString application =
         QStringLiteral("%1 %2").arg(Framework::Identity::FullName, Framework::Identity::FileVersion);
-    if (!m_root.WriteHardwareInfo(fileName, QString(), application, QStringList())) {
+    if (!m_root.WriteHardwareInfo(fileName, QString(), application, log.lines())) {
         log.add(tr("Unable to save hardware information to '%1'").arg(QDir::toNativeSeparators(fileName)),
                 Framework::LogEntry::Error);
         return false;

@@ -29,7 +29,8 @@ public:
     explicit KernelHost(CRoot &root);
     ~KernelHost() override;
 
-    // Enumerates the machine's storage and writes the report; the outcome is logged.
+    // Writes the report of the listed devices (enumerated first when nothing has been yet) with
+    // the application log's lines; the outcome is logged.
     bool saveHardwareInfo(const QString &fileName) override;
 
     // Opens an image file (any supported format) and adds it to the kernel as a virtual disk.

@@ -88,7 +88,8 @@ int Startup::run(const QStringList &argumentList, int &argc, char **argv)
             application = std::make_unique<Framework::Application>(m_options.application);
         }
 
-        guard = std::make_unique<Framework::SingleInstanceGuard>(m_options.instanceKey);
+        guard = std::make_unique<Framework::SingleInstanceGuard>(
+            Framework::SingleInstanceGuard::userKey(m_options.instanceKey));
         if (!guard->acquire())
             throw GenericError(tr("%1 is already running").arg(Framework::Identity::FullName),
                                GenericError::Warning);

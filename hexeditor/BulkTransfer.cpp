@@ -73,13 +73,16 @@ void Thread::say(const QString &text)
     emit message(text);
 }
 
+void Thread::conclude(const QString &text)
+{
+    QMutexLocker lock(&m_logMutex);
+    m_log << text;
+    m_result = text;
+}
+
 bool Thread::fail(const QString &text)
 {
-    {
-        QMutexLocker lock(&m_logMutex);
-        m_result = text;
-    }
-    say(text);
+    conclude(text);
     return false;
 }
 
@@ -359,13 +362,7 @@ bool Thread::work()
         break;
     }
     if (ok) {
-        const QString done =
-            tr("%1 completed: %2 bytes").arg(title(), QLocale().toString(qulonglong(m_done.load())));
-        {
-            QMutexLocker lock(&m_logMutex);
-            m_result = done;
-        }
-        say(done);
+        conclude(tr("%1 completed: %2 bytes").arg(title(), QLocale().toString(qulonglong(m_done.load()))));
     }
     m_succeeded = ok;
     return ok;

@@ -56,9 +56,11 @@ public:
     std::uint64_t room() const { return m_room; }
     bool sameStorage() const { return m_source && m_source == m_target; }
 
-    // Log lines so far (also sent through message()).
+    // Log lines so far, the result last once there is one (the lines before it are also sent
+    // through message()).
     QStringList log() const;
-    // After the end: the result ("%1 canceled by user", an error, or the completion line).
+    // After the end: the result ("%1 canceled by user", an error, or the completion line). It is
+    // not sent through message(): the owner reports it with the outcome.
     QString result() const;
     bool succeeded() const { return m_succeeded; }
     std::uint64_t bytesDone() const { return m_done.load(); }
@@ -75,6 +77,8 @@ protected:
 private:
     Thread(Mode mode, QObject *parent);
     void say(const QString &text);
+    // Records the result line.
+    void conclude(const QString &text);
     bool fail(const QString &text);
     bool runSaveToFile();
     bool runInsertFromFile();

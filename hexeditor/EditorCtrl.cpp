@@ -73,7 +73,7 @@ EditorCtrl::EditorCtrl(Storage *storage, bool readOnly, QWidget *parent)
 EditorCtrl::~EditorCtrl()
 {
     // A running block transfer ends (its written steps stay) before its owner goes.
-    onThreadStop();
+    stopTransfer();
     if (m_storage)
         Clipboard::unregisterStorage(m_storage);
 }

@@ -148,6 +148,8 @@ public:
     void setBulkStarter(BulkStarter starter) { m_bulkStarter = std::move(starter); }
     bool isTransferRunning() const;
     void setTransferRunning(bool on) { m_transferRunning = on; }
+    // Stops the running block transfer and waits for its end (closing, destruction).
+    void stopTransfer();
     // Starts a block transfer on the worker thread (through the installed starter, if any).
     bool startTransfer(const BulkRequest &request);
 
@@ -185,7 +187,8 @@ public slots:
     // A file storage's view mode (disk 0, partition 1, file 2): asks to save applied edits first,
     // then switches and moves the caret to the file's first byte.
     void onFileViewModeChanged(int mode);
-    // Stops the running block transfer (the status bar's stop button).
+    // Asks the running block transfer to stop (the status bar's stop button) and returns at once;
+    // the transfer ends with "%1 canceled by user" and transferFinished follows.
     void onThreadStop();
 
 signals:
@@ -205,7 +208,8 @@ signals:
     // Command states (save, undo, redo, editing, selection) may have changed.
     void commandStateChanged();
     void progress(int percent);
-    // A block transfer ended: whether it succeeded and its result line.
+    // A block transfer ended: whether it succeeded and its result line (already in the log, and
+    // a failure shown in a box).
     void transferFinished(bool succeeded, const QString &result);
     // A line of the running transfer's log.
     void transferMessage(const QString &text);

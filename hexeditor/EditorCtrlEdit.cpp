@@ -145,7 +145,7 @@ bool EditorCtrl::queryClose()
                    "view?"),
                 QMessageBox::Yes | QMessageBox::No, QMessageBox::No) != QMessageBox::Yes)
             return false;
-        onThreadStop();
+        stopTransfer();
     }
     if (!m_storage || !hasAppliedEdits())
         return true;

@@ -7,8 +7,31 @@
 #include "BulkTransfer.h"
 #include "ClientFramework/AppIdentity.h"
 #include "ClientFramework/DialogSeam.h"
+#include "ClientFramework/Log/ApplicationLog.h"
 
 namespace HexEditor {
+
+namespace {
+
+// The end of a transfer for the user: every result goes to the log, a failure also in a box (a
+// stop the user asked for needs no box).
+void reportResult(const BulkTransfer::Thread &thread)
+{
+    using Framework::LogEntry;
+    auto &log = Framework::ApplicationLog::instance();
+    const QString result = thread.result();
+    if (thread.succeeded()) {
+        log.add(result, LogEntry::Successful);
+    } else if (thread.cancelled()) {
+        log.add(result);
+    } else {
+        log.add(result, LogEntry::Error);
+        Framework::DialogSeam::current().message(QMessageBox::Critical, thread.title(), result,
+                                                 QMessageBox::Ok, QMessageBox::Ok);
+    }
+}
+
+} // namespace
 
 bool EditorCtrl::isTransferRunning() const
 {
@@ -16,6 +39,12 @@ bool EditorCtrl::isTransferRunning() const
 }
 
 void EditorCtrl::onThreadStop()
+{
+    if (auto *thread = qobject_cast<BulkTransfer::Thread *>(m_transfer.data()))
+        thread->cancel();
+}
+
+void EditorCtrl::stopTransfer()
 {
     if (auto *thread = qobject_cast<BulkTransfer::Thread *>(m_transfer.data())) {
         thread->cancel();
@@ -89,20 +118,29 @@ bool EditorCtrl::startTransfer(const BulkRequest &request)
             emit commandStateChanged();
     }
     m_transfer = thread;
+    // The request's lines so far, then the thread's as they come.
+    auto logLine = [this](const QString &text) {
+        Framework::ApplicationLog::instance().add(text);
+        emit transferMessage(text);
+    };
+    for (const QString &line : thread->log())
+        logLine(line);
     connect(thread, &BulkTransfer::Thread::progress, this, &EditorCtrl::progress);
-    connect(thread, &BulkTransfer::Thread::message, this, &EditorCtrl::transferMessage);
+    connect(thread, &BulkTransfer::Thread::message, this, logLine);
     connect(thread, &BulkTransfer::Thread::written, this, [this](const DiskArea &area) {
         emit dataChanged(area);
         viewport()->update();
     });
     connect(thread, &QThread::finished, this, [this, thread] {
         m_transferRunning = false;
+        reportResult(*thread);
         emit transferFinished(thread->succeeded(), thread->result());
         caretChanged(true);
         viewport()->update();
         thread->deleteLater();
     });
     thread->start();
+    emit progress(0);
     return true;
 }
 

@@ -407,8 +407,13 @@ void View::connectEditor()
     });
     connect(m_editor, &EditorCtrl::mftRecordRequested, this, [this] { gotoMftRecord(); });
     connect(m_editor, &EditorCtrl::catalogNodeRequested, this, [this] { gotoCatalogNode(); });
+    // A block transfer in the status bar: progress and the stop button while it runs, its result
+    // as the tip when it ends.
     connect(m_editor, &EditorCtrl::progress, m_status, &StatusCtrl::onThreadProgress);
-    connect(m_status, &StatusCtrl::stopProcess, m_editor, [this] { m_editor->setTransferRunning(false); });
+    connect(m_editor, &EditorCtrl::transferFinished, m_status, [this](bool succeeded, const QString &result) {
+        m_status->onThreadFinished(succeeded ? 0 : 1, result);
+    });
+    connect(m_status, &StatusCtrl::stopProcess, m_editor, &EditorCtrl::onThreadStop);
 }
 
 void View::onEditorStateChanged(bool isHexOffset, bool isReadOnly, bool isBigEndian)

@@ -203,6 +203,22 @@ int ApplicationLog::warningCount() const
     return m_warnings;
 }
 
+QStringList ApplicationLog::lines() const
+{
+    QMutexLocker lock(&m_mutex);
+    QStringList out;
+    // Depth first: an entry's children follow it, as they do in the file.
+    QList<const LogEntry *> pending(m_entries.crbegin(), m_entries.crend());
+    while (!pending.isEmpty()) {
+        const LogEntry *entry = pending.takeLast();
+        if ((m_options & DetailMaximum) || !(entry->attributes() & LogEntry::Hidden))
+            out << entry->line();
+        for (auto it = entry->children().crbegin(); it != entry->children().crend(); ++it)
+            pending.append(*it);
+    }
+    return out;
+}
+
 void ApplicationLog::writeEntry(const LogEntry *entry)
 {
     if (!(m_options & DetailMaximum) && (entry->attributes() & LogEntry::Hidden))

@@ -37,6 +37,10 @@ public:
     LogEntry *addChild(LogEntry *parent, const QString &text, uint32_t outcome = LogEntry::None,
                        uint32_t attributes = 0);
 
+    // The entries in memory as the file shows them, children after their parent (hidden entries
+    // only at the maximum detail level).
+    QStringList lines() const;
+
     // Removes every entry from memory (the file keeps what was written).
     void clear();
 

@@ -3,7 +3,9 @@
 #include "Application.h"
 #include "Log/ApplicationLog.h"
 
+#include "Kernel/Implementation/Device.h"
 #include "Kernel/Implementation/Platform/PlatformFile.h"
+#include "Kernel/Implementation/RootStatus.h"
 #include "Kernel/Implementation/SystemError.h"
 #include "Kernel/Implementation/cRoot.h"
 
@@ -61,6 +63,17 @@ void connect(cRoot *root, Application *application, ConditionTests conditions)
                 ApplicationLog::instance().add(r.text, LogEntry::Warning);
         },
         Qt::QueuedConnection);
+    // Devices arriving and leaving, and the enumeration around them. The root delivers these on
+    // its own thread while the device still exists (a removed one is destroyed after its removal
+    // has been delivered), so its name is read right there, not in a queued call.
+    QObject::connect(
+        root, &cRoot::kernelStorage, &log,
+        [](const _event_storage &e) {
+            const QString text = StorageEventText(e.code, e.device ? e.device->GetDisplayName() : QString());
+            if (!text.isEmpty())
+                ApplicationLog::instance().add(text);
+        },
+        Qt::DirectConnection);
     QObject::connect(
         root, &cRoot::kernelDebug, &log,
         [](const _event_debug &r) {

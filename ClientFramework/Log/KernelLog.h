@@ -24,7 +24,9 @@ struct ConditionTests
     bool (*internal)(const _event_internal &record) = nullptr;
 };
 
-// Logs the trace, misuse and platform-failure records of the root (queued to the log's thread).
+// Logs the trace, misuse and platform-failure records of the root (queued to the log's thread), and
+// its storage events: "Accessing local devices...", "Data storage detected %1", "Storage removed %1"
+// and "Local devices enumeration completed".
 // Records the tests take for conditions go through the application's logCondition, warnings that
 // leave the exit status alone (plain warnings once the application is gone); every other platform
 // failure is an error and every other misuse record a warning.

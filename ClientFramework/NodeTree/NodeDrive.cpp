@@ -2,6 +2,7 @@
 
 #include "NodeFolder.h"
 #include "NodeMenu.h"
+#include "VolumeIntegrityGroup.h"
 
 #include "Kernel/Implementation/Device.h"
 #include "Kernel/Implementation/FS/Volume.h"
@@ -133,7 +134,8 @@ bool NodeDrive::isDamaged() const
     std::uint64_t valid = 0;
     std::uint64_t checked = 0;
     m_volume->GetIntegrity(valid, checked);
-    return checked != CVolume::AllItems && valid != CVolume::AllItems && valid < checked;
+    // Damaged: an item the volume was expected to have is not valid.
+    return checked != CVolume::AllItems && (valid & checked) != checked;
 }
 
 QString NodeDrive::statusText() const
@@ -243,6 +245,8 @@ QList<PropertyGroup> NodeDrive::properties() const
     if (m_volume && m_volume->IsReady())
         vol.items.append({tr("Cluster Size"), QString::number(m_volume->GetClusterSize()), QString()});
     groups.append(vol);
+    if (m_volume && m_volume->IsReady())
+        groups.append(VolumeIntegrityGroup::of(m_volume));
     return groups;
 }
 

@@ -2,6 +2,7 @@
 
 #include "NodeDrive.h"
 #include "NodeMenu.h"
+#include "VolumeIntegrityGroup.h"
 #include "VolumeSource.h"
 
 #include "Kernel/Implementation/Device.h"
@@ -177,6 +178,8 @@ QList<PropertyGroup> NodePartition::properties() const
     if (m_partition && m_partition->GetActive())
         part.items.append({tr("Active"), tr("Yes"), QString()});
     groups.append(part);
+    if (m_volume && m_volume->IsReady())
+        groups.append(VolumeIntegrityGroup::of(m_volume));
     return groups;
 }
 

@@ -1,8 +1,10 @@
 // The main window's toolbar and the commands that act on the node views: the toolbar built from the
 // registry with its icons and kept with the window state, the first-start size, "SMART Info" and
 // "Open in File Explorer" following the selection, "Reload" of a folder and of a disk, "Stop" and
-// "Stop All" of folder populations (with the process rules of the registry), and "Select All".
+// "Stop All" of folder populations (with the process rules of the registry), "Select All", and
+// "Save Hardware Info as..." over the listed disks.
 #include "app/Commander.h"
+#include "app/KernelHost.h"
 #include "app/MainView.h"
 #include "app/NodeCommands.h"
 
@@ -19,8 +21,13 @@
 #include "ClientFramework/Views/WindowManager.h"
 #include "Kernel/Implementation/Root.h"
 
+#include "ClientFramework/Log/ApplicationLog.h"
+#include "ClientFramework/NodeTree/NodeDevice.h"
+#include "Kernel/Implementation/Device.h"
+
 #include "MemoryVolume.h"
 #include "RecordingDialogs.h"
+#include "RootTestSupport.h"
 #include "ScratchHome.h"
 #include "TestMainWindow.h"
 #include "TestUtil.h"
@@ -562,4 +569,53 @@ TEST(MainWindowCommands, WindowClosesWhilePopulationsRun)
     EXPECT_FALSE(commander.hasHandler("cmdUpdate"));
     EXPECT_FALSE(commander.action("cmdNode_StopAll")->isEnabled());
     commander.action("cmdNode_StopAll")->trigger(); // reaches nothing that is gone
+}
+
+TEST(MainWindowCommands, HardwareInfoReportsTheListedDisksWithTheLog)
+{
+    ScratchHome home;
+    RecordingDialogs dialogs;
+    Framework::ScriptedPrompts prompts;
+    // A machine of two fixed disks, listed before the window shows.
+    ScriptedBackend backend;
+    RootTest::FakeSource source;
+    RootTest::AnswerGeometry(backend);
+    backend.AddFile("/dev/sdx", RootTest::Disk(1 << 20, true));
+    backend.AddFile("/dev/sdy", RootTest::Disk(1 << 20, true));
+    source.Set({RootTest::Candidate("/dev/sdx", 0), RootTest::Candidate("/dev/sdy", 1)});
+    CRoot root(&backend, &source);
+    ASSERT_TRUE(root.RefreshAndWait());
+    CLI::KernelHost host(root); // outlives the window, as at start-up
+    Solution::Commander commander;
+    Solution::MainView view(&commander);
+    view.setKernel(&root);
+    view.setHooks({{}, [&host](const QString &path) { return host.saveHardwareInfo(path); }});
+    view.build();
+    const QList<NodeDevice *> nodes = view.nodeRoot()->deviceNodes();
+    ASSERT_EQ(nodes.size(), 2);
+    const QList<CDevice *> devices = root.Devices();
+    QSignalSpy storage(&root, &cRoot::kernelStorage);
+    Framework::ApplicationLog::instance().add("A line the report carries: <sdx>");
+
+    const QString report = home.file("hddinfo.xml");
+    prompts.files << report;
+    commander.action("cmdHddInfo")->trigger();
+    QCoreApplication::processEvents();
+
+    // No refresh ran: the disks, their nodes and the views on them stay as they were.
+    EXPECT_TRUE(storage.isEmpty());
+    EXPECT_EQ(root.Devices(), devices);
+    EXPECT_EQ(view.nodeRoot()->deviceNodes(), nodes);
+    // The report lists both disks and ends with the log's lines, as the log file shows them.
+    QDomDocument doc;
+    ASSERT_TRUE(doc.setContent(backend.FileData(report))) << "the report was written";
+    const QDomElement top = doc.documentElement();
+    EXPECT_EQ(top.firstChildElement("devices").elementsByTagName("device").size(), 2);
+    const QString logInfo = top.firstChildElement("log_info").text();
+    EXPECT_FALSE(logInfo.contains("No log info"));
+    const QStringList logLines = logInfo.split('\n');
+    const QStringList carried = logLines.filter("A line the report carries: <sdx>");
+    ASSERT_EQ(carried.size(), 1) << logLines.join('\n').toStdString();
+    EXPECT_TRUE(carried.first().startsWith(">>"));
+    EXPECT_TRUE(Framework::ApplicationLog::instance().lines().contains(carried.first().mid(2).trimmed()));
 }

@@ -6,6 +6,7 @@
 #include "TestUtil.h"
 
 #include "ClientFramework/Application.h"
+#include "ClientFramework/SingleInstanceGuard.h"
 #include "Kernel/Implementation/KernelVersion.h"
 
 #include <QApplication>
@@ -106,7 +107,8 @@ TEST_F(StartupTest, CommandLineErrorIgnoreGoesOn)
 
 TEST_F(StartupTest, SecondInstanceIsRefused)
 {
-    QSharedMemory running(key);
+    // Another instance over the same configuration folder.
+    QSharedMemory running(Framework::SingleInstanceGuard::userKey(key));
     ASSERT_TRUE(running.create(1024));
     LogWatch watch;
     EXPECT_EQ(run({}), 1);

@@ -1,14 +1,17 @@
 // The kernel's records in the log: what the condition tests pick goes to the application as a
 // condition (a warning that leaves the exit status alone), the rest keeps its weight; with no
-// application left a condition is a plain warning.
+// application left a condition is a plain warning. Devices arriving and leaving are logged too.
 #include "ClientFramework/Application.h"
 #include "ClientFramework/Log/ApplicationLog.h"
 #include "ClientFramework/Log/KernelLog.h"
 #include "Kernel/Implementation/Root.h"
 
+#include "LogTestUtil.h"
+#include "RootTestSupport.h"
 #include "ScratchHome.h"
 
 #include <QApplication>
+#include <QRegularExpression>
 #include <QSignalSpy>
 #include <gtest/gtest.h>
 
@@ -113,4 +116,32 @@ TEST(KernelLogConditions, TestedRecordsAreConditionsOfTheApplication)
     ASSERT_TRUE(byText(added).contains(late));
     EXPECT_TRUE(byText(added).value(late) & LogEntry::Warning);
     EXPECT_FALSE(byText(added).value(late) & LogEntry::Error);
+}
+
+TEST(KernelLogStorage, DevicesArrivingAndLeavingAreLogged)
+{
+    ScratchHome home;
+    ScriptedBackend backend;
+    RootTest::FakeSource source;
+    RootTest::AnswerGeometry(backend);
+    backend.AddFile("/dev/sdx", RootTest::Disk(1 << 20, true));
+    backend.AddFile("/dev/sdy", RootTest::Disk(1 << 20, true));
+    source.Set({RootTest::Candidate("/dev/sdx", 0), RootTest::Candidate("/dev/sdy", 1)});
+    CRoot root(&backend, &source);
+    Framework::KernelLog::connect(&root);
+    LogWatch log;
+
+    ASSERT_TRUE(root.RefreshAndWait());
+    ASSERT_EQ(root.GetDeviceCount(), 2u);
+    source.Set({RootTest::Candidate("/dev/sdy", 1)}); // sdx is unplugged
+    ASSERT_TRUE(root.RefreshAndWait());
+    QCoreApplication::processEvents();
+
+    // (Other records of the scripted machine may come between.)
+    static const QRegularExpression storageLine("^(Accessing|Data storage|Storage removed|Local devices) ");
+    const QStringList storage = log.texts().filter(storageLine);
+    EXPECT_EQ(storage, QStringList({"Accessing local devices...", "Data storage detected Disk sdx",
+                                    "Data storage detected Disk sdy", "Local devices enumeration completed",
+                                    "Accessing local devices...", "Storage removed Disk sdx",
+                                    "Local devices enumeration completed"}));
 }

@@ -1,5 +1,7 @@
 // The node tree over real disk images: keys, texts, nesting of partitions and volumes, status
-// and colours, context menus, default commands and the device nodes following the kernel.
+// and colours, context menus, default commands, the device nodes following the kernel, and a
+// volume's integrity in its status and the property pane.
+#include "MemoryVolume.h"
 #include "NodeTestSupport.h"
 
 #include "NodeTree/NodeComputer.h"
@@ -11,6 +13,7 @@
 #include "NodeTree/NodePartition.h"
 #include "NodeTree/NodeRoot.h"
 #include "Themes/Theme.h"
+#include "Views/PropertyPane.h"
 
 #include <QAction>
 #include <QCoreApplication>
@@ -18,6 +21,7 @@
 #include <QJsonDocument>
 #include <QJsonObject>
 #include <QMenu>
+#include <QTreeWidget>
 
 #include <gtest/gtest.h>
 
@@ -555,4 +559,114 @@ TEST(NodeFiles, ZeroSizeFileOpensItsRecord)
     EXPECT_EQ(menuIds(folderMenu),
               QStringList({"cmdHex_FileRecord", "cmdOpenInOSBrowser", "|", "cmdProperties"}));
     NodeCore::setCommander(nullptr);
+}
+
+namespace {
+
+// A volume in memory whose integrity masks the test sets.
+class AssessedVolume : public TestVolumes::MemoryVolume
+{
+public:
+    AssessedVolume(std::uint64_t valid, std::uint64_t checked)
+    {
+        m_validItems = valid;
+        m_checkedItems = checked;
+    }
+};
+
+// The rows of one group of the property pane, label to value.
+QList<QPair<QString, QString>> paneRows(const Framework::PropertyPane &pane, const QString &group)
+{
+    QList<QPair<QString, QString>> rows;
+    for (int i = 0; i < pane.tree()->topLevelItemCount(); ++i) {
+        const QTreeWidgetItem *top = pane.tree()->topLevelItem(i);
+        if (top->text(0) != group)
+            continue;
+        for (int r = 0; r < top->childCount(); ++r)
+            rows.append({top->child(r)->text(0), top->child(r)->text(1)});
+    }
+    return rows;
+}
+
+} // namespace
+
+TEST(NodeDriveIntegrity, DamagedWhenAnExpectedItemIsNotValid)
+{
+    constexpr std::uint64_t All = CVolume::AllItems;
+    const struct
+    {
+        std::uint64_t valid, checked;
+        bool damaged;
+    } cases[] = {
+        {All, All, false},    // not assessed
+        {0x3, 0x3, false},    // every expected item valid
+        {0x7, 0x3, false},    // an item valid that was not expected ("Yes")
+        {All, 0x3, false},    // everything valid
+        {0x1, 0x3, true},     // the copy is missing
+        {0x101, 0x3, true},   // the copy is missing, though the mask is the larger number
+        {0x10000, 0x3, true}, // none of the expected items valid
+        {0x0, 0x10000, true}, // nothing valid
+    };
+    for (const auto &c : cases) {
+        AssessedVolume volume(c.valid, c.checked);
+        NodeDrive drive(&volume);
+        EXPECT_EQ(drive.isDamaged(), c.damaged)
+            << std::hex << "valid 0x" << c.valid << " checked 0x" << c.checked;
+        EXPECT_EQ(drive.text(NodeAttr::Status), c.damaged ? "Damaged" : "Ready");
+    }
+}
+
+TEST(NodeDriveIntegrity, PropertyPaneShowsTheGradeAndTheItemsOfAVolume)
+{
+    if (!TestUtil::haveTool("mkudffs"))
+        GTEST_SKIP() << "mkudffs is needed";
+    QTemporaryDir dir;
+    const QString whole = dir.filePath("udf.img");
+    ASSERT_TRUE(makeSparse(whole, 8 << 20));
+    ASSERT_EQ(TestUtil::run("mkudffs", {"--label=ULBL", whole}).exitCode, 0);
+    // The same volume without the copies of its anchor at the end of the medium.
+    const QString cut = dir.filePath("cut.img");
+    QByteArray bytes = TestUtil::readFile(whole);
+    bytes.replace(bytes.size() - (2 << 20), 2 << 20, QByteArray(2 << 20, '\0'));
+    ASSERT_TRUE(TestUtil::writeFile(cut, bytes));
+
+    using Rows = QList<QPair<QString, QString>>;
+    const struct
+    {
+        QString image;
+        QString status;
+        Rows rows;
+    } cases[] = {
+        {whole,
+         "Ready",
+         {{"Overall Integrity Status", "Excellent"},
+          {"Primary Boot Sector", "Valid"},
+          {"Copy of Boot Sector", "Valid"},
+          {"Primary Boot Sector matches a Copy", "Valid"}}},
+        {cut,
+         "Damaged",
+         {{"Overall Integrity Status", "Invalid"},
+          {"Primary Boot Sector", "Valid"},
+          {"Copy of Boot Sector", "Invalid"},
+          {"Primary Boot Sector matches a Copy", "Invalid"}}},
+    };
+    for (const auto &c : cases) {
+        CRoot root;
+        CDevice *device = open(root, c.image);
+        ASSERT_NE(device, nullptr);
+        NodeRoot tree(&root);
+        NodeCore *drive = tree.deviceNode(device);
+        while (drive && drive->kind() != NodeKind::Drive)
+            drive = drive->childCount() ? drive->child(0) : nullptr;
+        ASSERT_NE(drive, nullptr);
+        EXPECT_EQ(drive->text(NodeAttr::Status), c.status);
+        Framework::PropertyPane pane;
+        pane.showNodes({drive});
+        EXPECT_EQ(paneRows(pane, "Volume Integrity Info"), c.rows) << c.image.toStdString();
+        // The partition that holds the volume shows it too.
+        if (drive->parent()->kind() == NodeKind::Partition) {
+            pane.showNodes({drive->parent()});
+            EXPECT_EQ(paneRows(pane, "Volume Integrity Info"), c.rows);
+        }
+    }
 }

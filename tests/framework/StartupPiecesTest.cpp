@@ -54,6 +54,37 @@ TEST(SingleInstanceGuard, SecondInstanceIsRefused)
     EXPECT_TRUE(second.acquire());
 }
 
+TEST(SingleInstanceGuard, OneInstancePerConfigurationFolder)
+{
+    const QString base = uniqueKey();
+    auto environment = [](const QString &home, const QString &config) {
+        QProcessEnvironment e;
+        if (!home.isNull())
+            e.insert("HOME", home);
+        if (!config.isNull())
+            e.insert("XDG_CONFIG_HOME", config);
+        return e;
+    };
+    const struct
+    {
+        QProcessEnvironment first, second;
+        bool secondRuns;
+    } cases[] = {
+        {environment("/home/a", "/tmp/x/config"), environment("/home/a", "/tmp/y/config"), true},
+        {environment("/home/a", {}), environment("/home/b", {}), true},
+        {environment("/home/a", "/tmp/x/config"), environment("/home/b", "/tmp/x/config"), false},
+        {environment("/home/a", {}), environment("/home/a", "/home/a/.config"), false},
+        {environment("/home/a", {}), environment("/home/a", {}), false},
+    };
+    for (const auto &c : cases) {
+        SingleInstanceGuard first(SingleInstanceGuard::userKey(base, c.first));
+        ASSERT_TRUE(first.acquire());
+        SingleInstanceGuard second(SingleInstanceGuard::userKey(base, c.second));
+        EXPECT_EQ(second.acquire(), c.secondRuns)
+            << SingleInstanceGuard::userKey(base, c.second).toStdString();
+    }
+}
+
 TEST(SingleInstanceGuard, SegmentOfACrashedProcessDoesNotBlock)
 {
     const QString key = uniqueKey();

@@ -1,12 +1,26 @@
-// The status bar's texts for the caret, the selection, the offset format and the editing mode.
+// The status bar's texts for the caret, the selection, the offset format and the editing mode, and
+// a block transfer of the view: its progress and stop button, and its result reaching the user.
 #include "hexeditor/StatusCtrl.h"
+
+#include "LogTestUtil.h"
+#include "RecordingDialogs.h"
+#include "StorageTestMedium.h"
+#include "TestUtil.h"
+#include "hexeditor/EditorCtrl.h"
+#include "hexeditor/Storage.h"
+#include "hexeditor/View.h"
 
 #include <QLabel>
 #include <QProgressBar>
 #include <QSignalSpy>
+#include <QTemporaryDir>
+#include <QTest>
 #include <QToolButton>
 #include <gtest/gtest.h>
 
+#include <memory>
+
+using HexEditor::EditorCtrl;
 using HexEditor::StatusCtrl;
 
 namespace {
@@ -77,4 +91,86 @@ TEST(StatusBar, FormatEditingModeAndProgress)
     EXPECT_EQ(stop.count(), 1);
     status.onThreadFinished(0, "done");
     EXPECT_TRUE(status.progressBar()->isHidden());
+}
+
+namespace {
+
+// A view over a medium in memory with editing on, inserting `file` at `offset` when asked.
+struct TransferView
+{
+    QTemporaryDir dir;
+    MemoryMedium medium;
+    HexEditor::View view;
+    QString file;
+
+    TransferView(std::uint64_t bytes, const QByteArray &fileBytes)
+        : medium(QByteArray(qsizetype(bytes), '\0')),
+          view(nullptr, std::make_unique<HexEditor::Storage>(&medium), false), file(dir.filePath("in.bin"))
+    {
+        TestUtil::writeFile(file, fileBytes);
+        view.editor()->setFileNameProvider([this](EditorCtrl::FileRequest, const QString &, const QString &,
+                                                  const QString &) { return file; });
+    }
+    bool statusShowsTransfer() const
+    {
+        return !view.statusCtrl()->stopButton()->isHidden() && !view.statusCtrl()->progressBar()->isHidden();
+    }
+    bool statusClear() const
+    {
+        return view.statusCtrl()->stopButton()->isHidden() && view.statusCtrl()->progressBar()->isHidden();
+    }
+};
+
+} // namespace
+
+TEST(ViewTransfer, FailedSectorWriteIsShownLoggedAndEndsTheProgress)
+{
+    RecordingDialogs dialogs;
+    TransferView t(64 * 512, QByteArray(8 * 512, 'Q'));
+    t.medium.badWrites.insert(4);
+    LogWatch log;
+    t.view.editor()->setCaretOffset(4 * 512);
+    QSignalSpy finished(t.view.editor(), &EditorCtrl::transferFinished);
+    t.view.editor()->onInsertData();
+    EXPECT_TRUE(t.statusShowsTransfer());
+    ASSERT_TRUE(finished.wait(20000));
+
+    const QString failure = QStringLiteral("Failed to write sector 4 to Memory. Error code 29.");
+    EXPECT_FALSE(finished[0].at(0).toBool());
+    EXPECT_EQ(finished[0].at(1).toString(), failure);
+    ASSERT_EQ(dialogs.calls.size(), 1);
+    EXPECT_EQ(dialogs.calls[0].icon, QMessageBox::Critical);
+    EXPECT_EQ(dialogs.calls[0].title, QStringLiteral("Insert data from file '%1'").arg(t.file));
+    EXPECT_EQ(dialogs.calls[0].text, failure);
+    EXPECT_TRUE(log.texts().contains(QStringLiteral("Loading from file: %1").arg(t.file)));
+    EXPECT_EQ(log.texts().last(), failure);
+    EXPECT_EQ(log.newErrors(), 1);
+    EXPECT_TRUE(t.statusClear());
+    EXPECT_EQ(t.view.statusCtrl()->progressBar()->toolTip(), failure);
+    EXPECT_FALSE(t.view.editor()->isTransferRunning());
+}
+
+TEST(ViewTransfer, StopButtonCancelsTheTransfer)
+{
+    RecordingDialogs dialogs;
+    const QByteArray payload(16 << 20, 'S');
+    TransferView t(payload.size(), payload);
+    t.medium.writeDelayMs = 50; // 32 steps of 1024 sectors: the stop lands half-way
+    LogWatch log;
+    QSignalSpy progress(t.view.editor(), &EditorCtrl::progress);
+    QSignalSpy finished(t.view.editor(), &EditorCtrl::transferFinished);
+    t.view.editor()->onInsertData();
+    ASSERT_TRUE(QTest::qWaitFor([&] { return progress.size() > 1; }, 20000)) << "a first step landed";
+    ASSERT_TRUE(t.statusShowsTransfer());
+    t.view.statusCtrl()->stopButton()->click();
+    ASSERT_TRUE(finished.size() > 0 || finished.wait(20000));
+
+    const QString cancelled = QStringLiteral("Insert data from file '%1' canceled by user").arg(t.file);
+    EXPECT_FALSE(finished[0].at(0).toBool());
+    EXPECT_EQ(finished[0].at(1).toString(), cancelled);
+    EXPECT_LT(t.medium.sectorsWritten.load(), std::uint64_t(payload.size() / 512));
+    EXPECT_TRUE(dialogs.calls.isEmpty()) << "a stop the user asked for needs no box";
+    EXPECT_EQ(log.texts().last(), cancelled);
+    EXPECT_EQ(log.newErrors(), 0);
+    EXPECT_TRUE(t.statusClear());
 }
