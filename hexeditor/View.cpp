@@ -632,16 +632,7 @@ bool View::setFileViewMode(int mode)
 
 bool View::queryClose()
 {
-    if (m_editor->isTransferRunning()) {
-        const auto answer =
-            Framework::DialogSeam::current().message(QMessageBox::Question, Framework::Identity::ShortName,
-                                                     tr("This view cannot be closed while data transfer is "
-                                                        "in progress.\nStop process and close the view?"),
-                                                     QMessageBox::Yes | QMessageBox::No, QMessageBox::No);
-        if (answer != QMessageBox::Yes)
-            return false;
-        m_editor->setTransferRunning(false);
-    }
+    // The editor asks about a running transfer (and stops it) and about unsaved edits.
     return m_editor->queryClose();
 }
 
@@ -679,7 +670,7 @@ void View::releaseMedium()
     m_node = nullptr;
     const bool lost = m_storage && m_storage->isModified();
     // A transfer thread reads and writes the object itself: it ends before the object does.
-    m_editor->onThreadStop();
+    m_editor->stopTransfer();
     if (auto *dock = paneDock(TemplatesPane))
         if (auto *templates = qobject_cast<Templates::View *>(dock->widget()))
             templates->setStorage(nullptr);
