@@ -151,11 +151,6 @@ TEST(CliDevices, WhatADeviceIsBuiltFromShowsInTextAndJson)
          "dm-1",
          "Disk luks-3f2a",
          {"    kind: Encrypted Volume (LUKS2)", "    members: /dev/mapper/vg-root"}},
-        {{BackingKind::SoftwareRaid, "raid1", "", {"/dev/sdd1", "/dev/sde1"}, {"/dev/mapper/vg-data"}},
-         "md0",
-         "Disk md0",
-         {"    kind: Software RAID (raid1)", "    members: /dev/sdd1, /dev/sde1",
-          "    holders: /dev/mapper/vg-data"}},
         // A disk of its own shows only what is built on it.
         {{BackingKind::None, "", "", {}, {"/dev/mapper/mpatha"}},
          "sdb",
