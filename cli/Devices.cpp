@@ -33,6 +33,8 @@ QString PathOf(const CDevice *device)
     return handle ? handle->GetName() : QString();
 }
 
+} // namespace
+
 QJsonObject DeviceJson(CDevice *d)
 {
     const DeviceInfo &info = d->GetDescriptor();
@@ -52,10 +54,14 @@ QJsonObject DeviceJson(CDevice *d)
     o.insert(QStringLiteral("rotation"), int(d->GetRotation()));
     o.insert(QStringLiteral("attributes"),
              QJsonArray::fromStringList(DeviceAttributeNames(d->GetAttributes())));
+    o.insert(QStringLiteral("kind"), BackingKindName(info.stack.kind));
+    o.insert(QStringLiteral("kindDetail"), info.stack.detail);
+    o.insert(QStringLiteral("members"), QJsonArray::fromStringList(info.stack.members));
+    o.insert(QStringLiteral("holders"), QJsonArray::fromStringList(info.stack.holders));
     return o;
 }
 
-void PrintText(QTextStream &out, uint32_t index, CDevice *d)
+void PrintDevice(QTextStream &out, uint32_t index, CDevice *d)
 {
     const DeviceInfo &info = d->GetDescriptor();
     out << "disk:" << index << "  " << d->GetDisplayName() << "  " << PathOf(d) << "\n";
@@ -68,12 +74,16 @@ void PrintText(QTextStream &out, uint32_t index, CDevice *d)
         << "; serial: " << d->GetSerial(0) << "; rotation: " << RotationText(d->GetRotation()) << "\n";
     if (!info.backingFile.isEmpty())
         out << "    image file: " << info.backingFile << "\n";
+    if (info.stack.kind != BackingKind::None)
+        out << "    kind: " << info.stack.KindText() << "\n";
+    if (!info.stack.members.isEmpty())
+        out << "    members: " << info.stack.members.join(QStringLiteral(", ")) << "\n";
+    if (!info.stack.holders.isEmpty())
+        out << "    holders: " << info.stack.holders.join(QStringLiteral(", ")) << "\n";
     out << "    attributes: " << DeviceAttributeText(d->GetAttributes()) << "\n";
     if (!info.ready && !info.notReadyReason.isEmpty())
         out << "    not ready: " << info.notReadyReason << "\n";
 }
-
-} // namespace
 
 int runDevices(const QStringList &args, Io &io)
 {
@@ -103,7 +113,7 @@ int runDevices(const QStringList &args, Io &io)
     if (devices.isEmpty())
         io.out << "No storage devices found.\n";
     for (qsizetype i = 0; i < devices.size(); ++i)
-        PrintText(io.out, uint32_t(i), devices[i]);
+        PrintDevice(io.out, uint32_t(i), devices[i]);
     return Ok;
 }
 

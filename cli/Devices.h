@@ -3,7 +3,15 @@
 
 #include "CliCommand.h"
 
+#include <QJsonObject>
+
+class CDevice;
+
 namespace Cli {
+
+// One device as an object of the --json list, and as the text block "disk:INDEX ...".
+QJsonObject DeviceJson(CDevice *device);
+void PrintDevice(QTextStream &out, uint32_t index, CDevice *device);
 
 int runDevices(const QStringList &args, Io &io);
 

@@ -210,6 +210,8 @@ QString NodeDevice::sourceText() const
     const DeviceInfo &info = m_device->GetDescriptor();
     if (info.source == EnumSource::VolumeBacked && !info.backingFile.isEmpty())
         return tr("Loaded from %1").arg(info.backingFile);
+    if (info.stack.kind != BackingKind::None)
+        return info.stack.KindText();
     return MediaTypeName(m_device->GetMediaType());
 }
 
@@ -263,6 +265,15 @@ QList<PropertyGroup> NodeDevice::properties() const
         if (!p.second.isEmpty())
             device.items.append(
                 {a == NodeAttr::FileSystem ? tr("Partition Style") : p.first, p.second, QString()});
+    }
+    if (m_device) {
+        const BlockStack &stack = m_device->GetDescriptor().stack;
+        if (!stack.members.isEmpty())
+            device.items.append({tr("Members"), stack.members.join(QStringLiteral(", ")),
+                                 tr("The block devices this device is built from")});
+        if (!stack.holders.isEmpty())
+            device.items.append({tr("Holders"), stack.holders.join(QStringLiteral(", ")),
+                                 tr("The block devices built on this device")});
     }
     if (!isReady())
         device.items.append({tr("Note"), notReadyTip(), QString()});

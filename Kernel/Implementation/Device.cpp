@@ -203,7 +203,10 @@ QString CDevice::GetDisplayName() const
             return QFileInfo(files.first()).fileName();
     }
     QString name = m_info.model;
-    const QString where = !m_info.kernelName.isEmpty() ? m_info.kernelName : QString::number(m_info.number);
+    // A mapped device goes by its mapped name, as the system's tools show it.
+    const QString where = !m_info.stack.mappedName.isEmpty() ? m_info.stack.mappedName
+                          : !m_info.kernelName.isEmpty()     ? m_info.kernelName
+                                                             : QString::number(m_info.number);
     if (name.isEmpty())
         return QStringLiteral("Disk %1").arg(where);
     return QStringLiteral("%1 (%2)").arg(name, where);

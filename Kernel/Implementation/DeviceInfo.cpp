@@ -169,3 +169,34 @@ QString RotationText(qint32 rotation)
         return QStringLiteral("%1 rpm").arg(rotation);
     return QStringLiteral("Unknown");
 }
+
+QString BackingKindName(BackingKind kind)
+{
+    switch (kind) {
+    case BackingKind::Loop:
+        return QStringLiteral("Loop Device");
+    case BackingKind::LogicalVolume:
+        return QStringLiteral("LVM Logical Volume");
+    case BackingKind::EncryptedVolume:
+        return QStringLiteral("Encrypted Volume");
+    case BackingKind::Multipath:
+        return QStringLiteral("Multipath Device");
+    case BackingKind::DeviceMapper:
+        return QStringLiteral("Device Mapper");
+    case BackingKind::SoftwareRaid:
+        return QStringLiteral("Software RAID");
+    case BackingKind::NetworkBlock:
+        return QStringLiteral("Network Block Device");
+    case BackingKind::None:
+        break;
+    }
+    return QString();
+}
+
+QString BlockStack::KindText() const
+{
+    const QString name = BackingKindName(kind);
+    if (name.isEmpty() || detail.isEmpty())
+        return name;
+    return QStringLiteral("%1 (%2)").arg(name, detail);
+}

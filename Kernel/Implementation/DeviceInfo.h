@@ -16,7 +16,8 @@ enum class EnumSource : quint8 {
     Floppy = 0,        // floppy volume by letter
     PhysicalDrive = 1, // physical drive
     OpticalDrive = 2,  // optical drive
-    VolumeBacked = 3,  // volume-backed device (on Linux: a loop device with a backing file)
+    VolumeBacked = 3,  // volume-backed device (on Linux: loop, device-mapper, software RAID and
+                       // network block devices)
 };
 
 // The kind of medium. Codes outside the list are possible and print as "Unknown Device".
@@ -159,6 +160,37 @@ constexpr qint32 MaxRpm = 65534;
 // "Unknown", "Solid State", "Rotating" or "%1 rpm".
 QString RotationText(qint32 rotation);
 
+// What a volume-backed device is built from on the platform. Codes print as the names of
+// `BackingKindName`.
+enum class BackingKind : quint8 {
+    None = 0,            // a drive of its own
+    Loop = 1,            // an image file attached as a device
+    LogicalVolume = 2,   // a logical volume of a volume group
+    EncryptedVolume = 3, // an opened encrypted volume (LUKS or plain)
+    Multipath = 4,       // one device over several paths to the same disk
+    DeviceMapper = 5,    // any other mapping of other block devices
+    SoftwareRaid = 6,    // a software RAID array
+    NetworkBlock = 7,    // a disk served over the network
+};
+// "Loop Device", "LVM Logical Volume", "Encrypted Volume", "Multipath Device", "Device Mapper",
+// "Software RAID", "Network Block Device"; empty for None.
+QString BackingKindName(BackingKind kind);
+
+// How a device stands among the platform's block devices: what it is built as, the devices it is
+// built from and the devices built on it. Members and holders are the platform's device paths.
+struct BlockStack
+{
+    BackingKind kind = BackingKind::None;
+    QString detail;      // the level of a software RAID ("raid1"), the format of an encrypted
+                         // volume ("LUKS2", "PLAIN"); may be empty
+    QString mappedName;  // the mapped name of a device-mapper device, as the system's tools show it
+    QStringList members; // the devices below it
+    QStringList holders; // the devices above it
+
+    // The kind's name with the detail in parentheses ("Software RAID (raid1)").
+    QString KindText() const;
+};
+
 // One piece of a volume on a device: the device's identity and a byte range on it.
 struct VolumeExtent
 {
@@ -222,6 +254,7 @@ struct DeviceInfo
     QString notReadyReason;   // why the device could not be opened or queried
     quint64 diskSequence = 0; // the platform's media sequence number, 0 when unknown
     bool removable = false;   // the platform reports removable media
+    BlockStack stack;         // what the device is built from and what is built on it
 
     // Byte sizes that follow from the shifts.
     quint32 bytesPerSector() const { return 1u << sectorShift; }

@@ -21,6 +21,7 @@ struct EnumCandidate
     quint16 number = 0;
     MediaType mediaType = MediaType::Fixed; // the platform's drive type
     bool openAsVolume = false;              // a floppy volume is opened as a Volume handle
+    bool readOnly = false; // opened for reading only (devices that other programs assemble and own)
 
     quint64 sizeBytes = 0;
     quint32 logicalSectorSize = 0;
@@ -33,6 +34,7 @@ struct EnumCandidate
     QString managementSerial; // the serial of the system's device database
     QString backingFile;      // the image file behind a volume-backed device
     quint64 diskSequence = 0;
+    BlockStack stack; // what the device is built from and what is built on it
 };
 
 class IEnumerationSource

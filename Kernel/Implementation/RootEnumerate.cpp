@@ -116,12 +116,15 @@ bool CEnumerator::Identify(const EnumCandidate &c, DeviceInfo &info)
     info.backingFile = c.backingFile;
     info.diskSequence = c.diskSequence;
     info.removable = c.removable;
+    info.stack = c.stack;
     if (c.source == EnumSource::Floppy || c.source == EnumSource::OpticalDrive)
         info.partStyle = PartStyle::DeviceAsVolume;
     info.handle =
         new CPlatformFile(m_root, c.path, c.openAsVolume ? PlatformKind::Volume : PlatformKind::Device);
     CPlatformFile *h = info.handle;
     const QString name = c.path;
+    if (c.readOnly)
+        h->SetWritable(false);
 
     // 1. Open. A candidate that vanished meanwhile is dropped; any other refusal (rights, no
     // medium) still lists the device, as not ready, so the user sees why.

@@ -6,6 +6,7 @@
 #include "Kernel/Implementation/Platform/PlatformFile.h"
 #include "Kernel/Implementation/Root.h"
 #include "TestUtil.h"
+#include "cli/Devices.h"
 #include "cli/Source.h"
 
 #include <QJsonArray>
@@ -49,10 +50,11 @@ TEST(CliDevices, JsonMatchesBlockdevForLoopDevices)
         SCOPED_TRACE(loop->Device().toStdString());
         QJsonObject o = EntryFor(list, loop->Device());
         ASSERT_FALSE(o.isEmpty()) << r.out.toStdString();
-        const QStringList keys = {"number",       "source",    "name",       "path",
-                                  "mediaType",    "partStyle", "sectorSize", "physicalSectorSize",
-                                  "totalSectors", "model",     "firmware",   "serial",
-                                  "rotation",     "attributes"};
+        const QStringList keys = {"number",       "source",     "name",       "path",
+                                  "mediaType",    "partStyle",  "sectorSize", "physicalSectorSize",
+                                  "totalSectors", "model",      "firmware",   "serial",
+                                  "rotation",     "attributes", "kind",       "kindDetail",
+                                  "members",      "holders"};
         EXPECT_EQ(o.keys().size(), keys.size());
         for (const QString &k : keys)
             EXPECT_TRUE(o.contains(k)) << k.toStdString();
@@ -64,6 +66,7 @@ TEST(CliDevices, JsonMatchesBlockdevForLoopDevices)
         EXPECT_EQ(o.value("mediaType").toString(), "Fixed Disk");
         EXPECT_EQ(o.value("partStyle").toString(), "Raw (not partitioned)");
         EXPECT_TRUE(o.value("attributes").toArray().contains(QJsonValue("Virtual")));
+        EXPECT_EQ(o.value("kind").toString(), "Loop Device");
     }
     EXPECT_EQ(EntryFor(list, big.Device()).value("sectorSize").toInt(), 4096);
 
@@ -132,4 +135,53 @@ TEST(CliDevices, SourceResolver)
             viaNumber = c;
     }
     EXPECT_EQ(viaNumber, d);
+}
+
+TEST(CliDevices, WhatADeviceIsBuiltFromShowsInTextAndJson)
+{
+    struct Row
+    {
+        BlockStack stack;
+        QString kernelName;
+        QString name;      // expected display name
+        QStringList lines; // expected lines of the text block
+    };
+    const QList<Row> rows = {
+        {{BackingKind::EncryptedVolume, "LUKS2", "luks-3f2a", {"/dev/mapper/vg-root"}, {}},
+         "dm-1",
+         "Disk luks-3f2a",
+         {"    kind: Encrypted Volume (LUKS2)", "    members: /dev/mapper/vg-root"}},
+        // A disk of its own shows only what is built on it.
+        {{BackingKind::None, "", "", {}, {"/dev/mapper/mpatha"}},
+         "sdb",
+         "Disk sdb",
+         {"    holders: /dev/mapper/mpatha"}},
+    };
+    CRoot root;
+    for (const Row &r : rows) {
+        SCOPED_TRACE(r.name.toStdString());
+        DeviceInfo info;
+        info.source =
+            r.stack.kind == BackingKind::None ? EnumSource::PhysicalDrive : EnumSource::VolumeBacked;
+        info.mediaType = MediaType::Fixed;
+        info.kernelName = r.kernelName;
+        info.stack = r.stack;
+        CDevice device(&root, info);
+        EXPECT_EQ(device.GetDisplayName(), r.name);
+
+        QString text;
+        QTextStream out(&text);
+        Cli::PrintDevice(out, 0, &device);
+        out.flush();
+        for (const QString &line : r.lines)
+            EXPECT_TRUE(text.split('\n').contains(line)) << text.toStdString();
+        EXPECT_EQ(text.contains("kind:"), r.stack.kind != BackingKind::None);
+        EXPECT_EQ(text.contains("members:"), !r.stack.members.isEmpty());
+
+        const QJsonObject o = Cli::DeviceJson(&device);
+        EXPECT_EQ(o.value("kind").toString(), BackingKindName(r.stack.kind));
+        EXPECT_EQ(o.value("kindDetail").toString(), r.stack.detail);
+        EXPECT_EQ(o.value("members").toVariant().toStringList(), r.stack.members);
+        EXPECT_EQ(o.value("holders").toVariant().toStringList(), r.stack.holders);
+    }
 }

@@ -20,6 +20,7 @@
 #include <QJsonArray>
 #include <QJsonDocument>
 #include <QJsonObject>
+#include <QMap>
 #include <QMenu>
 #include <QTreeWidget>
 
@@ -384,6 +385,27 @@ TEST(NodeStatus, DeviceKeysByKind)
     DeviceInfo raid = plain;
     raid.mediaType = MediaType::RaidAssembly;
     EXPECT_EQ(keyOf(raid), "raid-2");
+}
+
+TEST(NodeStatus, AssembledDeviceShowsWhatItIsBuiltFrom)
+{
+    CRoot root;
+    DeviceInfo info;
+    info.number = 0x8000;
+    info.source = EnumSource::VolumeBacked;
+    info.mediaType = MediaType::Fixed;
+    info.kernelName = "md0";
+    info.stack = {
+        BackingKind::SoftwareRaid, "raid1", "", {"/dev/sdd1", "/dev/sde1"}, {"/dev/mapper/vg-data"}};
+    CDevice device(&root, info);
+    NodeDevice n(&device);
+    EXPECT_EQ(n.text(NodeAttr::Source), "Software RAID (raid1)");
+    QMap<QString, QString> items;
+    for (const PropertyGroup &g : n.properties())
+        for (const PropertyItem &i : g.items)
+            items.insert(i.label, i.value);
+    EXPECT_EQ(items.value("Members"), "/dev/sdd1, /dev/sde1");
+    EXPECT_EQ(items.value("Holders"), "/dev/mapper/vg-data");
 }
 
 TEST_F(NodeTreeImages, ContextMenusByNodeKind)

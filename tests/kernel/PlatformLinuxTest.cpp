@@ -1,8 +1,12 @@
 // The platform handle on this machine: ordinary files, and loop devices attached to images made here,
-// checked against dd, blockdev and sysfs.
+// checked against dd, blockdev and sysfs; and the Linux listing over a recorded /sys/block of mapped,
+// RAID and network block devices, read through a loop device standing in for each.
+#include "Implementation/Device.h"
 #include "Implementation/Platform/DeviceControl.h"
+#include "Implementation/Platform/Linux/SysfsEnumerate.h"
 #include "Implementation/Platform/PlatformFile.h"
 #include "Implementation/Platform/PlatformOps.h"
+#include "Implementation/Root.h"
 #include "Implementation/SystemError.h"
 #include "TestRoot.h"
 #include "TestUtil.h"
@@ -489,6 +493,170 @@ TEST(PlatformLinuxFileTest, FileHandlesAnswerNoDeviceControls)
     QList<uint64_t> offsets;
     EXPECT_FALSE(disk.GetLayoutInfo(offsets));
     EXPECT_TRUE(disk.Close());
+}
+
+// One block device of a recorded /sys/block and how the listing is to show it. Lists of names are
+// separated by blanks.
+struct StackRow
+{
+    QString name;   // kernel name
+    QString dmName; // dm/name (device mapper only)
+    QString dmUuid; // dm/uuid (device mapper only)
+    QString level;  // md/level (software RAID only)
+    quint64 sectors = 0;
+    quint32 sectorSize = 512;
+    QString slaves, holders; // kernel names
+    // Expected: the path below the /dev folder (empty: not listed), kind, detail, number, and the
+    // members and holders below the /dev folder.
+    QString path;
+    BackingKind kind = BackingKind::None;
+    QString detail;
+    int number = -1;
+    QString members, above;
+};
+
+// A root on LVM inside LUKS, a multipath disk, a plain mapping and one with nothing mapped, a mirror, a
+// connected and an idle network block device, one path of the multipath disk and a loop device without
+// an image.
+QList<StackRow> StackRows()
+{
+    using K = BackingKind;
+    const QString lvm = "LVM-Yx3nQ8cW0x3nQ8cWqP1kM2nB3vC4xZ5aS6dF7gH8jK9lL0Yx3nQ8cW0x3nQ8cW";
+    const QString luks = "CRYPT-LUKS2-3f2a8c1d4e5b46a7b8c9d0e1f2a3b4c5-luks-3f2a";
+    const QString mpath = "mpath-3600a0b800012345600000000deadbeef";
+    return {
+        {"dm-0", "vg-root", lvm, "", 16384, 512, "sda2", "dm-1", "mapper/vg-root", K::LogicalVolume, "",
+         0x4000, "sda2", "mapper/luks-3f2a"},
+        {"dm-1", "luks-3f2a", luks, "", 16000, 4096, "dm-0", "", "mapper/luks-3f2a", K::EncryptedVolume,
+         "LUKS2", 0x4001, "mapper/vg-root", ""},
+        {"dm-2", "mpatha", mpath, "", 8192, 512, "sdc sdb", "", "mapper/mpatha", K::Multipath, "", 0x4002,
+         "sdb sdc", ""},
+        {"dm-3", "scratch", "", "", 4096, 512, "sdd3", "", "mapper/scratch", K::DeviceMapper, "", 0x4003,
+         "sdd3", ""},
+        {"dm-4", "vg-empty", "LVM-unmapped", "", 0, 512, "", "", "", K::None, "", -1, "", ""},
+        {"md0", "", "", "raid1", 20480, 512, "sde1 sdd1", "", "md0", K::SoftwareRaid, "raid1", 0x8000,
+         "sdd1 sde1", ""},
+        {"nbd0", "", "", "", 8192, 512, "", "", "nbd0", K::NetworkBlock, "", 0xC000, "", ""},
+        {"nbd1", "", "", "", 0, 512, "", "", "", K::None, "", -1, "", ""},
+        {"sdb", "", "", "", 8192, 512, "", "dm-2", "sdb", K::None, "", 0, "", "mapper/mpatha"},
+        {"loop0", "", "", "", 0, 512, "", "", "", K::None, "", -1, "", ""},
+    };
+}
+
+// Lays the rows out as /sys/block does: attribute files and the slaves and holders links.
+void MakeSysBlock(const QString &root, const QList<StackRow> &rows)
+{
+    QDir dir;
+    auto put = [](const QString &path, const QString &text) {
+        QDir().mkpath(QFileInfo(path).path());
+        ASSERT_TRUE(TestUtil::writeFile(path, (text + "\n").toUtf8()));
+    };
+    for (const StackRow &r : rows) {
+        const QString base = root + "/" + r.name;
+        put(base + "/size", QString::number(r.sectors));
+        put(base + "/queue/logical_block_size", QString::number(r.sectorSize));
+        put(base + "/queue/physical_block_size", QString::number(r.sectorSize));
+        if (!r.dmName.isEmpty()) {
+            put(base + "/dm/name", r.dmName);
+            put(base + "/dm/uuid", r.dmUuid);
+        }
+        if (!r.level.isEmpty())
+            put(base + "/md/level", r.level);
+        ASSERT_TRUE(dir.mkpath(base + "/slaves"));
+        ASSERT_TRUE(dir.mkpath(base + "/holders"));
+        // Links point where the kernel's point; partitions of disks that are not recorded dangle.
+        for (const QString &s : r.slaves.split(' ', Qt::SkipEmptyParts))
+            ASSERT_TRUE(QFile::link("../../" + s, base + "/slaves/" + s));
+        for (const QString &h : r.holders.split(' ', Qt::SkipEmptyParts))
+            ASSERT_TRUE(QFile::link("../../" + h, base + "/holders/" + h));
+    }
+}
+
+QStringList Below(const QString &devRoot, const QString &names)
+{
+    QStringList out;
+    for (const QString &n : names.split(' ', Qt::SkipEmptyParts))
+        out << devRoot + "/" + n;
+    return out;
+}
+
+// Listed from the recorded tree; then, where loop devices can be attached, each device's node stands in
+// by one loop device over an ext4 image, and the devices are identified and read through the kernel.
+TEST(PlatformLinuxListing, MappedRaidAndNetworkDevicesAreVolumeBacked)
+{
+    QTemporaryDir dir;
+    ASSERT_TRUE(dir.isValid());
+    const QString sysBlock = dir.filePath("sys/block"), devRoot = dir.filePath("dev");
+    const QList<StackRow> rows = StackRows();
+    MakeSysBlock(sysBlock, rows);
+    CSysfsEnumerationSource source(sysBlock, devRoot);
+    const QList<EnumCandidate> candidates = source.Candidates();
+    for (const StackRow &r : rows) {
+        SCOPED_TRACE(r.name.toStdString());
+        const EnumCandidate *c = nullptr;
+        for (const EnumCandidate &each : candidates)
+            c = each.kernelName == r.name ? &each : c;
+        if (r.path.isEmpty()) {
+            EXPECT_EQ(c, nullptr);
+            continue;
+        }
+        ASSERT_NE(c, nullptr);
+        EXPECT_EQ(c->path, devRoot + "/" + r.path);
+        EXPECT_EQ(c->number, r.number);
+        EXPECT_EQ(c->stack.kind, r.kind);
+        EXPECT_EQ(c->stack.detail, r.detail);
+        EXPECT_EQ(c->stack.mappedName, r.dmName);
+        EXPECT_EQ(c->stack.members, Below(devRoot, r.members));
+        EXPECT_EQ(c->stack.holders, Below(devRoot, r.above));
+        EXPECT_EQ(c->sizeBytes, r.sectors * 512);
+        EXPECT_EQ(c->logicalSectorSize, r.sectorSize);
+        const bool stacked = r.kind != BackingKind::None;
+        EXPECT_EQ(c->source, stacked ? EnumSource::VolumeBacked : EnumSource::PhysicalDrive);
+        // What other programs assemble over the user's data is only opened for reading.
+        EXPECT_EQ(c->readOnly, stacked);
+        EnumCandidate resolved;
+        ASSERT_TRUE(source.Resolve(devRoot + "/" + r.path, resolved));
+        EXPECT_EQ(resolved.kernelName, r.name);
+    }
+
+    if (!TestUtil::canAttachLoop() || !TestUtil::haveTool("mke2fs"))
+        GTEST_SKIP() << "reading the devices needs root, losetup and mke2fs";
+    const QString image = dir.filePath("lv.img");
+    const auto mk = TestUtil::run("mke2fs", {"-q", "-F", "-t", "ext4", "-L", "MAPPED", image, "8M"});
+    ASSERT_EQ(mk.exitCode, 0) << mk.err.toStdString();
+    TestUtil::LoopDevice loop(image);
+    ASSERT_FALSE(loop.Device().isEmpty());
+    ASSERT_TRUE(QDir().mkpath(devRoot + "/mapper"));
+    for (const StackRow &r : rows) {
+        if (r.kind != BackingKind::None) {
+            ASSERT_TRUE(QFile::link(loop.Device(), devRoot + "/" + r.path));
+        }
+    }
+    CRoot root(nullptr, &source);
+    ASSERT_TRUE(root.RefreshAndWait());
+    const QByteArray head = TestUtil::readFile(image).left(4096);
+    for (const StackRow &r : rows) {
+        SCOPED_TRACE(r.name.toStdString());
+        CDevice *d = root.FindDeviceByPath(devRoot + "/" + r.path);
+        // The disk whose node is not there is not listed.
+        if (r.kind == BackingKind::None) {
+            EXPECT_EQ(d, nullptr);
+            continue;
+        }
+        ASSERT_NE(d, nullptr);
+        ASSERT_TRUE(d->IsReady());
+        QByteArray buffer(4096, '\0');
+        uint32_t error = 0;
+        ASSERT_TRUE(d->ReadBytes(0, 4096, buffer.data(), error)) << error;
+        EXPECT_EQ(buffer, head);
+        const DeviceInfo &info = d->GetDescriptor();
+        EXPECT_EQ(info.stack.kind, r.kind);
+        // The file system on the whole device is its one volume.
+        ASSERT_EQ(info.volumes.size(), 1);
+        EXPECT_EQ(info.volumes[0].path, devRoot + "/" + r.path);
+        EXPECT_EQ(info.volumes[0].label, "MAPPED");
+        EXPECT_EQ(d->GetPartStyle(), PartStyle::DeviceAsVolume);
+    }
 }
 
 } // namespace

@@ -252,3 +252,34 @@ TEST(RootEnumerate, VolumesAreClaimedByIdentityAndDifferencesReported)
     EXPECT_EQ(list[1].partStyle, PartStyle::Mbr);
     EXPECT_TRUE(f.internal.contains(QStringLiteral("Device=/dev/sdb(9), Volume=/dev/sdb1(12)")));
 }
+
+TEST(RootEnumerate, AssembledDevicesAreOpenedOnlyForReading)
+{
+    struct Row
+    {
+        QString path;
+        bool readOnly;
+        BackingKind kind;
+    };
+    for (const Row &r : {Row{"/dev/loop2", false, BackingKind::Loop},
+                         Row{"/dev/mapper/vg-root", true, BackingKind::LogicalVolume},
+                         Row{"/dev/md0", true, BackingKind::SoftwareRaid}}) {
+        SCOPED_TRACE(r.path.toStdString());
+        Fixture f;
+        f.backend.AddFile(r.path, Disk(1 << 20, false));
+        EnumCandidate c = Candidate(r.path, 2, EnumSource::VolumeBacked);
+        c.readOnly = r.readOnly;
+        c.stack.kind = r.kind;
+        c.stack.members = QStringList{"/dev/sda2", "/dev/sdb2"};
+        c.stack.holders = QStringList{"/dev/mapper/luks-1"};
+        DeviceInfo info;
+        ASSERT_TRUE(f.Identify(c, info));
+        EXPECT_EQ(info.ready, 1);
+        EXPECT_EQ(f.backend.CallCount("open rw"), r.readOnly ? 0 : 1);
+        EXPECT_EQ(f.backend.CallCount("open ro"), r.readOnly ? 1 : 0);
+        // What it is built from travels with the descriptor.
+        EXPECT_EQ(info.stack.kind, r.kind);
+        EXPECT_EQ(info.stack.members, c.stack.members);
+        EXPECT_EQ(info.stack.holders, c.stack.holders);
+    }
+}

@@ -184,8 +184,15 @@ TEST(RootLoop, PlatformListingNamesAndNumbers)
     EXPECT_EQ(Classify("loop7"), Kind::Loop);
     EXPECT_EQ(Classify("zram0"), Kind::Skip);
     EXPECT_EQ(Classify("ram0"), Kind::Skip);
-    EXPECT_EQ(Classify("dm-0"), Kind::Skip);
-    EXPECT_EQ(Classify("md127"), Kind::Skip);
+    EXPECT_EQ(Classify("dm-0"), Kind::DeviceMapper);
+    EXPECT_EQ(Classify("md127"), Kind::SoftwareRaid);
+    EXPECT_EQ(Classify("nbd15"), Kind::NetworkBlock);
+    EXPECT_EQ(Classify("md_d0"), Kind::Skip);
+    EXPECT_EQ(Classify("dm-"), Kind::Skip);
+    // Each kind of volume-backed device numbers in its own range; loop devices keep theirs.
+    EXPECT_EQ(VolumeBackedNumber(Kind::Loop, 3), 3);
+    EXPECT_EQ(VolumeBackedNumber(Kind::NetworkBlock, 0x3FFF), 0xFFFF);
+    EXPECT_EQ(VolumeBackedNumber(Kind::NetworkBlock, 0x4000), -1);
     EXPECT_EQ(TrailingNumber("loop12"), 12);
     EXPECT_EQ(TrailingNumber("sda"), -1);
     EXPECT_LT(NaturalKey("sdz"), NaturalKey("sdaa"));

@@ -21,6 +21,23 @@ Kind Classify(const QString &name)
     };
     if (startsWithThenDigitOrLetter("loop"))
         return Kind::Loop;
+    // Only the plain numbered names: md_d0 and the like are not arrays of today's kernels.
+    auto prefixThenNumber = [&](const char *prefix) {
+        const qsizetype n = qsizetype(strlen(prefix));
+        if (!name.startsWith(QLatin1String(prefix)) || name.size() == n)
+            return false;
+        for (qsizetype i = n; i < name.size(); ++i) {
+            if (!name.at(i).isDigit())
+                return false;
+        }
+        return true;
+    };
+    if (prefixThenNumber("dm-"))
+        return Kind::DeviceMapper;
+    if (prefixThenNumber("md"))
+        return Kind::SoftwareRaid;
+    if (prefixThenNumber("nbd"))
+        return Kind::NetworkBlock;
     if (startsWithThenDigitOrLetter("sr"))
         return Kind::Optical;
     if (startsWithThenDigitOrLetter("fd"))
@@ -45,6 +62,25 @@ int TrailingNumber(const QString &name)
     bool ok = false;
     int n = name.mid(i).toInt(&ok);
     return ok ? n : -1;
+}
+
+int VolumeBackedNumber(Kind kind, int kernelNumber)
+{
+    constexpr int range = 0x4000;
+    if (kernelNumber < 0 || kernelNumber >= range)
+        return -1;
+    switch (kind) {
+    case Kind::Loop:
+        return kernelNumber;
+    case Kind::DeviceMapper:
+        return range + kernelNumber;
+    case Kind::SoftwareRaid:
+        return 2 * range + kernelNumber;
+    case Kind::NetworkBlock:
+        return 3 * range + kernelNumber;
+    default:
+        return -1;
+    }
 }
 
 QString NaturalKey(const QString &name)
@@ -210,6 +246,21 @@ struct DevNumber
     bool valid = false;
 };
 
+// The kind of a device-mapper device from the prefix its owner gives its uuid; the format of an
+// encrypted volume is the uuid's second field ("CRYPT-LUKS2-...").
+BackingKind DeviceMapperKind(const QString &uuid, QString &detail)
+{
+    if (uuid.startsWith(QLatin1String("LVM-")))
+        return BackingKind::LogicalVolume;
+    if (uuid.startsWith(QLatin1String("CRYPT-"))) {
+        detail = uuid.section(QLatin1Char('-'), 1, 1);
+        return BackingKind::EncryptedVolume;
+    }
+    if (uuid.startsWith(QLatin1String("mpath-")))
+        return BackingKind::Multipath;
+    return BackingKind::DeviceMapper;
+}
+
 DevNumber ParseDev(const QString &text)
 {
     DevNumber d;
@@ -233,6 +284,53 @@ CSysfsEnumerationSource::CSysfsEnumerationSource(const QString &sysBlock, const 
 QString CSysfsEnumerationSource::Attribute(const QString &kernelName, const QString &relative) const
 {
     return ReadSmall(m_sysBlock + QLatin1Char('/') + kernelName + QLatin1Char('/') + relative);
+}
+
+QString CSysfsEnumerationSource::DevicePath(const QString &kernelName) const
+{
+    const QString mapped = Attribute(kernelName, QStringLiteral("dm/name"));
+    if (!mapped.isEmpty())
+        return m_devRoot + QStringLiteral("/mapper/") + mapped;
+    return m_devRoot + QLatin1Char('/') + kernelName;
+}
+
+QStringList CSysfsEnumerationSource::Related(const QString &kernelName, const QString &folder) const
+{
+    // The entries are links named after the devices; a link whose target is gone still names one.
+    QDir dir(m_sysBlock + QLatin1Char('/') + kernelName + QLatin1Char('/') + folder);
+    QStringList names = dir.entryList(QDir::AllEntries | QDir::System | QDir::NoDotAndDotDot);
+    std::sort(names.begin(), names.end(),
+              [](const QString &a, const QString &b) { return Sysfs::NaturalKey(a) < Sysfs::NaturalKey(b); });
+    QStringList out;
+    for (const QString &n : std::as_const(names))
+        out << DevicePath(n);
+    return out;
+}
+
+BlockStack CSysfsEnumerationSource::StackOf(const QString &kernelName, Sysfs::Kind kind) const
+{
+    BlockStack stack;
+    switch (kind) {
+    case Sysfs::Kind::Loop:
+        stack.kind = BackingKind::Loop;
+        break;
+    case Sysfs::Kind::DeviceMapper:
+        stack.kind = DeviceMapperKind(Attribute(kernelName, QStringLiteral("dm/uuid")), stack.detail);
+        stack.mappedName = Attribute(kernelName, QStringLiteral("dm/name"));
+        break;
+    case Sysfs::Kind::SoftwareRaid:
+        stack.kind = BackingKind::SoftwareRaid;
+        stack.detail = Attribute(kernelName, QStringLiteral("md/level"));
+        break;
+    case Sysfs::Kind::NetworkBlock:
+        stack.kind = BackingKind::NetworkBlock;
+        break;
+    default:
+        break;
+    }
+    stack.members = Related(kernelName, QStringLiteral("slaves"));
+    stack.holders = Related(kernelName, QStringLiteral("holders"));
+    return stack;
 }
 
 quint16 CSysfsEnumerationSource::PhysicalNumber(const QString &kernelName, const QStringList &present)
@@ -311,6 +409,7 @@ QList<EnumCandidate> CSysfsEnumerationSource::Candidates()
             c.managementSerial = Attribute(name, QStringLiteral("device/serial"));
         if (c.managementSerial.isEmpty())
             c.managementSerial = Attribute(name, QStringLiteral("serial"));
+        c.stack = StackOf(name, Sysfs::Classify(name));
     };
 
     {
@@ -335,11 +434,25 @@ QList<EnumCandidate> CSysfsEnumerationSource::Candidates()
         c.number = quint16(number);
         if (kind == Sysfs::Kind::Loop) {
             QString backing = Attribute(name, QStringLiteral("loop/backing_file"));
-            if (backing.isEmpty())
+            number = Sysfs::VolumeBackedNumber(kind, number);
+            if (backing.isEmpty() || number < 0)
                 continue;
+            c.number = quint16(number);
             c.source = EnumSource::VolumeBacked;
             c.mediaType = MediaType::Fixed;
             c.backingFile = backing;
+        } else if (kind == Sysfs::Kind::DeviceMapper || kind == Sysfs::Kind::SoftwareRaid ||
+                   kind == Sysfs::Kind::NetworkBlock) {
+            // Nothing mapped, assembled or connected: nothing to read, not listed (as a loop device
+            // without an image).
+            number = Sysfs::VolumeBackedNumber(kind, number);
+            if (number < 0 || ReadNumber(m_sysBlock + QLatin1Char('/') + name + QStringLiteral("/size")) == 0)
+                continue;
+            c.number = quint16(number);
+            c.source = EnumSource::VolumeBacked;
+            c.mediaType = MediaType::Fixed;
+            // Other programs assemble these over the user's data: they are only ever read here.
+            c.readOnly = true;
         } else if (kind == Sysfs::Kind::Optical) {
             c.source = EnumSource::OpticalDrive;
             c.mediaType = MediaType::CdRom;
@@ -350,6 +463,8 @@ QList<EnumCandidate> CSysfsEnumerationSource::Candidates()
             c.mediaType = MediaType::Floppy;
         }
         describe(name, c);
+        if (!c.stack.mappedName.isEmpty())
+            c.path = DevicePath(name);
         out.append(c);
     }
     if (udev)
@@ -406,10 +521,10 @@ QList<VolumeInfo> CSysfsEnumerationSource::Volumes()
                 shift = s;
         }
 
-        auto makeVolume = [&](const QString &name, const QString &sysDir, quint32 partNumber, quint64 start,
+        auto makeVolume = [&](const QString &path, const QString &sysDir, quint32 partNumber, quint64 start,
                               quint64 length) {
             VolumeInfo v;
-            v.path = m_devRoot + QLatin1Char('/') + name;
+            v.path = path;
             v.mediaType = disk.mediaType;
             v.sectorSize = sectorSize;
             v.sectorShift = quint8(shift);
@@ -460,7 +575,7 @@ QList<VolumeInfo> CSysfsEnumerationSource::Volumes()
             quint32 number = quint32(ReadNumber(sysDir + QStringLiteral("/partition")));
             quint64 start = ReadNumber(sysDir + QStringLiteral("/start")) * 512;
             quint64 length = ReadNumber(sysDir + QStringLiteral("/size")) * 512;
-            parts.append(makeVolume(entry, sysDir, number, start, length));
+            parts.append(makeVolume(m_devRoot + QLatin1Char('/') + entry, sysDir, number, start, length));
         }
         std::sort(parts.begin(), parts.end(), [](const VolumeInfo &a, const VolumeInfo &b) {
             return a.partitionNumber < b.partitionNumber;
@@ -472,7 +587,7 @@ QList<VolumeInfo> CSysfsEnumerationSource::Volumes()
         // No partitions: a file system on the whole device is its one volume.
         if (disk.sizeBytes == 0)
             continue;
-        VolumeInfo whole = makeVolume(disk.kernelName, diskDir, 0, 0, disk.sizeBytes);
+        VolumeInfo whole = makeVolume(disk.path, diskDir, 0, 0, disk.sizeBytes);
         if (!whole.fileSystemName.isEmpty())
             out.append(whole);
     }
