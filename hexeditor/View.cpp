@@ -681,11 +681,12 @@ void View::releaseMedium()
     QString text = tr("%1 was removed; its hex editor view is closed.").arg(m_diskName);
     if (lost)
         text += QLatin1Char(' ') + tr("Unsaved changes were lost.");
-    // Told once the removal is over: no box opens inside the node tree's update.
+    // The view goes first; the user is told once the removal is over (no box opens inside the node
+    // tree's update, and none keeps the emptied view on screen).
+    deleteLater();
     QMetaObject::invokeMethod(
         qApp, [text, lost] { GenericError(text, lost ? GenericError::Warning : GenericError::Information).report(); },
         Qt::QueuedConnection);
-    deleteLater();
 }
 
 QList<QAction *> View::widgetActions(Menu menu) const
