@@ -252,8 +252,8 @@ TEST_F(ImageVhd, BlockAllocationFlushesTheFooterAndTheTable)
     for (const QString &call : backend.Calls())
         if (call.startsWith("write") || call.startsWith("flush"))
             order << call;
-    EXPECT_EQ(order.mid(0, 5), (QStringList{"write 512", "flush /img/a.vhd", "write 512", "write 4",
-                                            "flush /img/a.vhd"}));
+    EXPECT_EQ(order.mid(0, 5),
+              (QStringList{"write 512", "flush /img/a.vhd", "write 512", "write 4", "flush /img/a.vhd"}));
 
     backend.ScriptFlush(SystemError::WriteFault);
     EXPECT_FALSE(handle.ReadWrite(false, 5000, 1, data.data(), error));
