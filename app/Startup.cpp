@@ -14,6 +14,7 @@
 #include "ClientFramework/GenericError.h"
 #include "ClientFramework/HighDpi.h"
 #include "ClientFramework/Log/ApplicationLog.h"
+#include "ClientFramework/Processing/ErrorHandling.h"
 #include "ClientFramework/QuitOnSignal.h"
 #include "ClientFramework/Settings/SettingsDocument.h"
 #include "ClientFramework/Views/RecentFiles.h"
@@ -127,6 +128,10 @@ int Startup::run(const QStringList &argumentList, int &argc, char **argv)
         // a normal condition, not a failure of the run); devices are enumerated on request.
         root = std::make_unique<CRoot>();
         KernelRecords::connect(root.get(), application.get());
+        // A failing sector is tried as often as the stored error handling, or the command line, asks.
+        root->RetryCount(Framework::Processing::ErrorHandling::forThisRun().transferAttempts());
+        if (m_options.kernelReady)
+            m_options.kernelReady(*root);
 
         commander = std::make_unique<Solution::Commander>();
         mainView = std::make_unique<MainView>(commander.get());

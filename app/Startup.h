@@ -6,6 +6,9 @@
 #include <QString>
 #include <QStringList>
 
+#include <functional>
+
+class CRoot;
 class QApplication;
 
 namespace Solution {
@@ -19,6 +22,8 @@ public:
         QApplication *application = nullptr;
         QString instanceKey = Framework::SingleInstanceGuard::DefaultKey;
         bool runEventLoop = true;
+        // Called with the disk kernel's root once it is set up for the run (tests look at it).
+        std::function<void(CRoot &)> kernelReady;
     };
 
     Startup() = default;

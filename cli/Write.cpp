@@ -6,6 +6,7 @@
 
 #include "Kernel/Implementation/Device.h"
 #include "Kernel/Implementation/Root.h"
+#include "Kernel/Implementation/SystemError.h"
 #include "OptionReader.h"
 #include "Source.h"
 #include "hexeditor/StorageSectorWrite.h"
@@ -45,6 +46,12 @@ int usage(Io &io, const QString &problem)
 } // namespace
 
 int runWrite(const QStringList &args, Io &io)
+{
+    CRoot root;
+    return runWrite(args, io, root);
+}
+
+int runWrite(const QStringList &args, Io &io, CRoot &root)
 {
     QString source, hex, file, problem;
     std::uint64_t offset = 0;
@@ -89,7 +96,6 @@ int runWrite(const QStringList &args, Io &io)
         return Failed;
     }
 
-    CRoot root;
     QString error;
     CDevice *device = resolveSource(root, source, error);
     if (!device) {
@@ -112,12 +118,24 @@ int runWrite(const QStringList &args, Io &io)
     }
     const HexEditor::SectorWrite::Result r =
         HexEditor::SectorWrite::writeBytes(*device, offset, bytes.constData(), std::uint64_t(bytes.size()));
-    device->Flush();
+    // What was written counts once it is on the medium.
+    std::uint32_t flushError = 0;
+    const bool flushed = device->Flush(flushError);
     if (!r.ok()) {
+        const bool refused = !r.readFailed && !r.written &&
+                             (r.error == SystemError::AccessDenied || r.error == SystemError::WriteProtect);
         io.err << "brindle-cli write: " << device->GetDisplayName() << ": "
-               << (r.readFailed ? "reading" : "writing") << " sector " << r.failedSector
-               << " failed (system error " << r.error << "); " << r.written << " of " << bytes.size()
-               << " bytes written\n";
+               << (refused ? QStringLiteral("cannot be opened for writing")
+                           : QStringLiteral("%1 sector %2 failed")
+                                 .arg(r.readFailed ? "reading" : "writing")
+                                 .arg(r.failedSector))
+               << " (system error " << r.error << ": " << systemErrorText(r.error) << "); " << r.written
+               << " of " << bytes.size() << " bytes written\n";
+        return Failed;
+    }
+    if (!flushed) {
+        io.err << "brindle-cli write: " << device->GetDisplayName() << ": the written data did not reach the "
+               << "medium (system error " << flushError << ": " << systemErrorText(flushError) << ")\n";
         return Failed;
     }
     io.out << "wrote " << bytes.size() << " bytes at offset " << offset << " to " << device->GetDisplayName()

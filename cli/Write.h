@@ -6,8 +6,12 @@
 
 #include "CliCommand.h"
 
+class CRoot;
+
 namespace Cli {
 
 int runWrite(const QStringList &args, Io &io);
+// The same over a given kernel root.
+int runWrite(const QStringList &args, Io &io, CRoot &root);
 
 } // namespace Cli

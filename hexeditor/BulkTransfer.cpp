@@ -4,12 +4,14 @@
 #include <QFile>
 #include <QFileInfo>
 #include <QLocale>
-#include <QSaveFile>
 #include <QStorageInfo>
 
 #include <algorithm>
 #include <cstring>
 
+#include "Kernel/Implementation/Platform/PlatformFile.h"
+#include "Kernel/Implementation/Platform/PlatformOps.h"
+#include "Kernel/Implementation/SystemError.h"
 #include "StorageSectorWrite.h"
 #include "StorageWriteGuard.h"
 
@@ -255,36 +257,59 @@ bool Thread::writeTarget(std::uint64_t offset, const QByteArray &bytes)
 
 bool Thread::runSaveToFile()
 {
-    QSaveFile file(m_path);
-    if (!file.open(QIODevice::WriteOnly))
-        return fail(tr("Unable to create file '%1': %2").arg(m_path, file.errorString()));
+    // The file is written under a name of its own next to the destination, flushed, and only then
+    // put in the destination's place: it appears complete and on the medium, or not at all.
+    const QString temp = m_path + QStringLiteral(".part");
+    CPlatformFile file(nullptr, temp, PlatformKind::File);
+    if (!file.Create())
+        return fail(tr("Unable to create file '%1': %2").arg(m_path, systemErrorText(file.GetError())));
+    auto abandon = [&file](bool result) {
+        file.Close(true);
+        return result;
+    };
     const std::uint64_t block = std::uint64_t(SectorsPerStep) * m_sourceObject->GetBytesPerSector();
     const std::uint64_t total = m_area.length;
     for (std::uint64_t at = 0; at < total;) {
-        if (cancelled()) {
-            file.cancelWriting();
-            return fail(tr("%1 canceled by user").arg(title()));
-        }
+        if (cancelled())
+            return abandon(fail(tr("%1 canceled by user").arg(title())));
         // Steps end on sector boundaries of the source.
         const std::uint64_t pos = m_area.offset + at;
         const std::uint64_t ss = m_sourceObject->GetBytesPerSector();
         const std::uint64_t n = std::min(total - at, block - pos % ss);
         QByteArray bytes;
-        if (!readSource(pos, n, bytes)) {
-            file.cancelWriting();
-            return false;
-        }
-        if (file.write(bytes) != bytes.size()) {
-            file.cancelWriting();
-            return fail(tr("Unable to write file '%1': %2").arg(m_path, file.errorString()));
-        }
+        if (!readSource(pos, n, bytes))
+            return abandon(false);
+        if (!file.Write(at, std::uint32_t(bytes.size()), bytes.constData()))
+            return abandon(
+                fail(tr("Unable to write file '%1': %2").arg(m_path, systemErrorText(file.GetError()))));
         at += n;
         m_done = at;
         step(total);
     }
-    if (!file.commit())
-        return fail(tr("Unable to write file '%1': %2").arg(m_path, file.errorString()));
+    std::uint32_t error = 0;
+    if (!file.Flush(error))
+        return abandon(fail(tr("Unable to write file '%1': %2").arg(m_path, systemErrorText(error))));
+    if (!file.Close(false)) {
+        error = file.GetError();
+        PlatformDeleteFile(nullptr, temp);
+        return fail(tr("Unable to write file '%1': %2").arg(m_path, systemErrorText(error)));
+    }
+    if (!PlatformMoveFile(nullptr, temp, m_path)) {
+        PlatformDeleteFile(nullptr, temp);
+        return fail(tr("Unable to write file '%1'").arg(m_path));
+    }
     return true;
+}
+
+bool Thread::flushTarget()
+{
+    std::uint32_t error = 0;
+    if (m_targetObject->Flush(error))
+        return true;
+    return fail(tr("The data did not reach %1 (Error [%2]: %3).")
+                    .arg(m_targetName)
+                    .arg(error)
+                    .arg(systemErrorText(error)));
 }
 
 bool Thread::runInsertFromFile()
@@ -298,8 +323,10 @@ bool Thread::runInsertFromFile()
         return fail(guard.refusal());
     const std::uint64_t block = std::uint64_t(SectorsPerStep) * m_targetObject->GetBytesPerSector();
     for (std::uint64_t at = 0; at < total;) {
-        if (cancelled())
+        if (cancelled()) {
+            flushTarget();
             return fail(tr("%1 canceled by user").arg(title()));
+        }
         const std::uint64_t pos = m_offset + at;
         const std::uint64_t ss = m_targetObject->GetBytesPerSector();
         const std::uint64_t n = std::min(total - at, block - pos % ss);
@@ -312,7 +339,7 @@ bool Thread::runInsertFromFile()
         m_done = at;
         step(total);
     }
-    return true;
+    return flushTarget();
 }
 
 bool Thread::runCopy()
@@ -328,8 +355,10 @@ bool Thread::runCopy()
     const bool backwards =
         m_sourceObject == m_targetObject && m_offset > m_area.offset && m_offset < m_area.offset + total;
     for (std::uint64_t at = 0; at < total;) {
-        if (cancelled())
+        if (cancelled()) {
+            flushTarget();
             return fail(tr("%1 canceled by user").arg(title()));
+        }
         const std::uint64_t n = std::min(total - at, block);
         const std::uint64_t rel = backwards ? total - at - n : at;
         QByteArray bytes;
@@ -342,7 +371,7 @@ bool Thread::runCopy()
         m_done = at;
         step(total);
     }
-    return true;
+    return flushTarget();
 }
 
 bool Thread::work()

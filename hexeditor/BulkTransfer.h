@@ -2,7 +2,8 @@
 // file at an offset, copy an area between storages (or within one). Data moves 1024 sectors per
 // step, read straight from the source's kernel object (with the source's unsaved edits laid over
 // it) and written straight to the target's medium; the target's cached copies of the written
-// sectors are dropped as each step lands. Stopping leaves the steps already written in place.
+// sectors are dropped as each step lands. A transfer is done when its data is on the medium (the
+// target is flushed). Stopping leaves the steps already written in place.
 //
 // Use: make a thread with one of the three constructors' helpers, call prepare() on the interface
 // thread (refusals, the room check and the log lines), ask the user what the answers call for
@@ -87,6 +88,8 @@ private:
     bool readSource(std::uint64_t offset, std::uint64_t length, QByteArray &out);
     // Writes bytes to the target's medium; false with the message.
     bool writeTarget(std::uint64_t offset, const QByteArray &bytes);
+    // Waits until what was written to the target is on its medium; false with the message.
+    bool flushTarget();
     void step(std::uint64_t total);
 
     Mode m_mode;

@@ -257,6 +257,8 @@ private:
     void editByte(uint64_t offset, const QByteArray &bytes);
     bool refuseTooBig(uint64_t length, const QString &title);
     QString saveQuestion() const;
+    // Saves the edits; a failure is shown and the edits stay (false).
+    bool saveEdits();
 
     std::unique_ptr<Painter> m_painter;
     Storage *m_storage = nullptr;

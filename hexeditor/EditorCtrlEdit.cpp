@@ -129,11 +129,32 @@ bool EditorCtrl::onSave()
             QMessageBox::Yes | QMessageBox::No, QMessageBox::No) != QMessageBox::Yes)
         return false;
     // After a failed sector write the history stays, so the edits can still be saved or reverted.
-    const QList<SaveFailure> failures = m_undo.save();
+    const bool saved = saveEdits();
     caretChanged();
     emit commandStateChanged();
     viewport()->update();
-    return failures.isEmpty();
+    return saved;
+}
+
+bool EditorCtrl::saveEdits()
+{
+    const QList<SaveFailure> failures = m_undo.save();
+    if (failures.isEmpty())
+        return true;
+    QStringList messages;
+    for (const SaveFailure &f : failures)
+        if (!messages.contains(f.message))
+            messages << f.message;
+    constexpr int Shown = 8;
+    if (messages.size() > Shown) {
+        const qsizetype more = messages.size() - Shown;
+        messages = messages.mid(0, Shown);
+        messages << tr("... and %1 more").arg(more);
+    }
+    ask(QMessageBox::Critical, Framework::Identity::FullName,
+        tr("The changes to %1 were not saved.\n%2").arg(m_storage->name(), messages.join(QLatin1Char('\n'))),
+        QMessageBox::Ok, QMessageBox::Ok);
+    return false;
 }
 
 bool EditorCtrl::queryClose()
@@ -162,7 +183,7 @@ bool EditorCtrl::queryClose()
     if (answer == QMessageBox::No)
         return true;
     // Yes: the view closes only when every sector was written.
-    if (!m_undo.save().isEmpty())
+    if (!saveEdits())
         return false;
     m_undo.clear();
     emit commandStateChanged();
@@ -184,7 +205,7 @@ bool EditorCtrl::queryModeChange()
                             QMessageBox::Yes | QMessageBox::No | QMessageBox::Cancel, QMessageBox::Cancel);
     if (answer == QMessageBox::Cancel)
         return false;
-    if (answer == QMessageBox::Yes && !m_undo.save().isEmpty())
+    if (answer == QMessageBox::Yes && !saveEdits())
         return false;
     // The mode change clears the cache: the history no longer applies.
     m_undo.clear();

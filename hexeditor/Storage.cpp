@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <cstring>
 
+#include "Kernel/Implementation/SystemError.h"
 #include "SectorCache.h"
 #include "StorageWriteGuard.h"
 
@@ -121,6 +122,22 @@ QString Storage::readFailureText(std::uint64_t n, std::uint32_t error) const
 QString Storage::writeFailureText(std::uint64_t n, std::uint32_t error) const
 {
     return tr("Failed to write sector %1 to %2. Error code %3.").arg(n).arg(name()).arg(error);
+}
+
+QString Storage::writeRefusedText(std::uint32_t error) const
+{
+    return tr("%1 cannot be opened for writing (Error [%2]: %3). Nothing was written; the changes are kept.")
+        .arg(name())
+        .arg(error)
+        .arg(systemErrorText(error));
+}
+
+QString Storage::flushFailureText(std::uint32_t error) const
+{
+    return tr("The changes did not reach %1 (Error [%2]: %3). They are kept as not saved.")
+        .arg(name())
+        .arg(error)
+        .arg(systemErrorText(error));
 }
 
 bool Storage::readFromKernel(std::uint64_t n, QByteArray &out, std::uint32_t &error)
@@ -277,6 +294,13 @@ std::uint64_t Storage::write(std::uint64_t offset, const QByteArray &bytes, bool
         }
         done += count;
     }
+    // Bytes written to the medium count once they are on it.
+    std::uint32_t flushError = 0;
+    if (!cacheOnly && done && !m_active->Flush(flushError)) {
+        emit writeFailed(flushFailureText(flushError));
+        emit dataChanged(DiskArea{offset, done});
+        return 0;
+    }
     if (done)
         emit dataChanged(DiskArea{offset, done});
     return done;
@@ -377,22 +401,44 @@ QList<SaveFailure> Storage::save()
         emit writeFailed(guard.refusal());
         return failures;
     }
-    QList<DiskArea> written;
+    QList<std::uint64_t> written;
     for (const std::uint64_t n : sectors) {
         CachedSector *s = m_cache->find(n);
         std::uint32_t error = 0;
         if (m_active->WriteSectors(n, 1, s->data.constData(), error)) {
-            s->modified.clear();
-            // A sector that could not be read was zeros plus edits; it is readable data now.
-            s->readOk = true;
-            m_cache->refresh(n);
-            appendRange(written, n * ss, ss);
+            written.append(n);
+        } else if (error == SystemError::AccessDenied || error == SystemError::WriteProtect) {
+            // The medium cannot be opened for writing: no other sector would fare better.
+            const QString message = writeRefusedText(error);
+            for (const std::uint64_t m : sectors)
+                if (!written.contains(m))
+                    failures.append({m, error, message});
+            emit writeFailed(message);
+            break;
         } else {
             failures.append({n, error, writeFailureText(n, error)});
             emit writeFailed(failures.last().message);
         }
     }
-    for (const DiskArea &a : written)
+    // Sectors are saved when they are on the medium: a failed flush keeps their edits.
+    std::uint32_t flushError = 0;
+    if (!written.isEmpty() && !m_active->Flush(flushError)) {
+        const QString message = flushFailureText(flushError);
+        for (const std::uint64_t n : written)
+            failures.append({n, flushError, message});
+        emit writeFailed(message);
+        return failures;
+    }
+    QList<DiskArea> areas;
+    for (const std::uint64_t n : written) {
+        CachedSector *s = m_cache->find(n);
+        s->modified.clear();
+        // A sector that could not be read was zeros plus edits; it is readable data now.
+        s->readOk = true;
+        m_cache->refresh(n);
+        appendRange(areas, n * ss, ss);
+    }
+    for (const DiskArea &a : areas)
         emit dataChanged(a);
     return failures;
 }

@@ -124,7 +124,7 @@ public:
     // cache, marking every byte modified. Otherwise each touched sector is written whole to the
     // medium at once (read-modify-write for a partial sector) and dropped from the cache. Returns
     // the number of bytes taken; on a failed medium write the failure is signalled and the count
-    // stops before that sector.
+    // stops before that sector; a failed flush of the medium is signalled and counts nothing.
     std::uint64_t write(std::uint64_t offset, const QByteArray &bytes, bool cacheOnly = true);
 
     // Sets or clears the modified marks of `area` (sectors are read into the cache as needed).
@@ -138,10 +138,11 @@ public:
     // The sectors that carry modified marks, ascending.
     QList<std::uint64_t> modifiedSectors() const;
 
-    // Writes every sector with modified marks whole to the medium, in ascending order. A sector
-    // written keeps its data and loses its marks; a sector whose write fails keeps them and is
-    // reported through writeFailed and the result. Refused as a whole (every sector reported)
-    // when writeRefusal() gives a reason.
+    // Writes every sector with modified marks whole to the medium, in ascending order, then flushes
+    // the medium. A sector written and flushed keeps its data and loses its marks; a sector whose
+    // write fails, every sector when the medium cannot be opened for writing, and every written
+    // sector when the flush fails keep them and are reported through writeFailed and the result.
+    // Refused as a whole (every sector reported) when writeRefusal() gives a reason.
     QList<SaveFailure> save();
     // The data of the modified sectors that overlap `area`, by sector number (a snapshot for a
     // worker thread that reads the medium and lays the edits over it).
@@ -192,6 +193,8 @@ private:
     const CachedSector *load(std::uint64_t n);
     QString readFailureText(std::uint64_t n, std::uint32_t error) const;
     QString writeFailureText(std::uint64_t n, std::uint32_t error) const;
+    QString writeRefusedText(std::uint32_t error) const;
+    QString flushFailureText(std::uint32_t error) const;
 
     DiskArea m_selection;
     std::unique_ptr<SectorCache> m_cache;

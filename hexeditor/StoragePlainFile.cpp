@@ -17,9 +17,8 @@ public:
     static constexpr std::uint32_t SectorSize = 512;
 
     PlainFileObject(const QString &path, cRoot *root)
-        : m_path(path), m_file(std::make_unique<CPlatformFile>(root, path, PlatformKind::File)), m_root(root)
+        : m_path(path), m_file(std::make_unique<CPlatformFile>(root, path, PlatformKind::File))
     {
-        m_file->SetWritable(false);
         m_open = m_file->Reopen(false) && m_file->GetSize(m_size);
         if (!m_open)
             m_error = m_file->GetError();
@@ -58,16 +57,6 @@ public:
     bool WriteBytes(std::uint64_t offset, std::uint64_t length, const void *buffer,
                     std::uint32_t &error) override
     {
-        error = 0;
-        if (!m_writable) {
-            auto file = std::make_unique<CPlatformFile>(m_root, m_path, PlatformKind::File);
-            if (!file->Reopen(false) || !file->IsWritable()) {
-                error = file->GetError() ? file->GetError() : SystemError::AccessDenied;
-                return false;
-            }
-            m_file = std::move(file);
-            m_writable = true;
-        }
         const auto *in = static_cast<const std::uint8_t *>(buffer);
         // The zeros after the end of the last partial sector are not part of the file.
         return transfer(offset, length, SystemError::WriteFault, error,
@@ -75,6 +64,8 @@ public:
                             return m_file->Write(offset + done, piece, in + done);
                         });
     }
+
+    bool Flush(std::uint32_t &error) override { return m_file->Flush(error); }
 
 private:
     // The bytes of a range that lie inside the file.
@@ -109,9 +100,7 @@ private:
 
     QString m_path;
     std::unique_ptr<CPlatformFile> m_file;
-    cRoot *m_root = nullptr;
     bool m_open = false;
-    bool m_writable = false;
     std::uint64_t m_size = 0;
     std::uint32_t m_error = 0;
 };

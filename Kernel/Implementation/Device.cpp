@@ -271,10 +271,47 @@ std::uint64_t CDevice::UserValue(std::uint64_t value)
 
 bool CDevice::Flush()
 {
-    if (!m_info.handle)
-        return true;
     std::uint32_t error = 0;
-    return m_info.handle->Flush(error);
+    return Flush(error);
+}
+
+bool CDevice::Flush(std::uint32_t &error)
+{
+    error = 0;
+    bool ok = true;
+    // Every path flushes; the first failure's error is kept.
+    auto flush = [&](auto &target) {
+        std::uint32_t e = 0;
+        if (!target.Flush(e) && ok) {
+            ok = false;
+            error = e;
+        }
+    };
+    if (m_info.handle)
+        flush(*m_info.handle);
+    if (m_image) {
+        std::uint32_t e = 0;
+        if (!DeviceImage::Flush(m_image, e) && ok) {
+            ok = false;
+            error = e;
+        }
+    }
+    if (m_raid)
+        flush(*m_raid);
+    // The volume handles that writes inside a volume (or all of a volume-backed device) go through.
+    std::vector<CPartition *> todo;
+    for (const auto &p : m_partitions)
+        todo.push_back(p.get());
+    for (std::size_t i = 0; i < todo.size(); ++i) {
+        for (const auto &c : todo[i]->Children())
+            todo.push_back(c.get());
+        if (CPlatformFile *h = todo[i]->GetVolumeHandle())
+            flush(*h);
+        // A device assembled from partitions of others writes through them.
+        if (m_info.partStyle == PartStyle::VirtualManager && !m_virtual && todo[i]->GetDevice() != this)
+            flush(*todo[i]);
+    }
+    return ok;
 }
 
 bool CDevice::Close(bool withPartitions)

@@ -57,6 +57,7 @@ public:
     bool ReadBytes(std::uint64_t offset, std::uint64_t length, void *buffer, std::uint32_t &error) override;
     bool WriteBytes(std::uint64_t offset, std::uint64_t length, const void *buffer,
                     std::uint32_t &error) override;
+    bool Flush(std::uint32_t &error) override;
 
     // cDevice
     bool IsReady() const override;

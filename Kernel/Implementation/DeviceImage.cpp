@@ -10,6 +10,11 @@ bool Transfer(CImageHandle *image, bool read, std::uint64_t first, std::uint32_t
     return image->ReadWrite(read, first, count, buffer, error);
 }
 
+bool Flush(CImageHandle *image, std::uint32_t &error)
+{
+    return image->Flush(error);
+}
+
 bool IsWritable(const CImageHandle *image)
 {
     return image->IsWritable();

@@ -12,6 +12,7 @@ namespace DeviceImage {
 bool Transfer(CImageHandle *image, bool read, std::uint64_t first, std::uint32_t count, void *buffer,
               std::uint32_t &error);
 bool IsWritable(const CImageHandle *image);
+bool Flush(CImageHandle *image, std::uint32_t &error);
 QStringList FileNames(const CImageHandle *image);
 void Destroy(CImageHandle *image);
 

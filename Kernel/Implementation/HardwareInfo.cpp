@@ -345,6 +345,9 @@ bool WriteDocument(cRoot *owner, const QString &target, const QByteArray &docume
     }
     if (ok)
         ok = file.Resize(total);
+    std::uint32_t flushError = 0;
+    if (ok)
+        ok = file.Flush(flushError);
     if (ok) {
         ok = file.Close(false);
         if (!ok)

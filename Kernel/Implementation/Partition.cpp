@@ -68,6 +68,12 @@ std::uint64_t CPartition::GetSize() const
     return m_length <= UINT64_MAX / bps ? m_length * bps : UINT64_MAX;
 }
 
+bool CPartition::Flush(std::uint32_t &error)
+{
+    error = 0;
+    return m_storage ? m_storage->Flush(error) : true;
+}
+
 bool CPartition::ReadSectors(std::uint64_t first, std::uint32_t count, void *buffer, std::uint32_t &error)
 {
     error = 0;

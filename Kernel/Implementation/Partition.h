@@ -94,6 +94,8 @@ public:
     bool ReadBytes(std::uint64_t offset, std::uint64_t length, void *buffer, std::uint32_t &error) override;
     bool WriteBytes(std::uint64_t offset, std::uint64_t length, const void *buffer,
                     std::uint32_t &error) override;
+    // The device's flush (which takes in the partition's own volume handle).
+    bool Flush(std::uint32_t &error) override;
 
     // The copy of the boot-record entry (16 bytes, zero for other sources).
     const std::array<std::uint8_t, 16> &GetEntry() const { return m_entry; }

@@ -522,6 +522,21 @@ bool CRaidHandle::WriteBytes(std::uint64_t offset, std::uint64_t length, const v
                         error);
 }
 
+bool CRaidHandle::Flush(std::uint32_t &error)
+{
+    QMutexLocker lock(&m_lock);
+    error = 0;
+    bool ok = true;
+    for (cStorage *member : m_members) {
+        std::uint32_t e = 0;
+        if (member && !member->Flush(e) && ok) {
+            ok = false;
+            error = e;
+        }
+    }
+    return ok;
+}
+
 bool CRaidHandle::ByteTransfer(bool read, std::uint64_t offset, std::uint64_t length, std::uint8_t *buffer,
                                std::uint32_t &error)
 {

@@ -61,6 +61,8 @@ public:
     bool ReadBytes(std::uint64_t offset, std::uint64_t length, void *buffer, std::uint32_t &error) override;
     bool WriteBytes(std::uint64_t offset, std::uint64_t length, const void *buffer,
                     std::uint32_t &error) override;
+    // Flushes every member that is present.
+    bool Flush(std::uint32_t &error) override;
 
 private:
     bool Build(const QList<cStorage *> &members, const QList<std::uint64_t> &starts,

@@ -110,6 +110,11 @@ uint32_t errnoToTransferError(int err)
     }
 }
 
+uint32_t errnoToFlushError(int err)
+{
+    return err == EIO ? SystemError::WriteFault : errnoToSystemError(err);
+}
+
 QString systemErrorText(uint32_t code)
 {
     if (code & SystemError::PlatformErrnoFlag)

@@ -65,6 +65,10 @@ uint32_t errnoToSystemError(int err);
 // and a removed medium as "media changed".
 uint32_t errnoToTransferError(int err);
 
+// Maps an errno of a flush onto a system error code: an I/O error there is a write that failed
+// after it had been taken into the system's cache.
+uint32_t errnoToFlushError(int err);
+
 // The platform's own text for a system error code (the text of the errno it came from where there is
 // one), without trailing line breaks.
 QString systemErrorText(uint32_t code);

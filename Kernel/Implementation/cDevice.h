@@ -34,7 +34,8 @@ public:
 
     virtual std::uint32_t GetPhysicalBytesPerSector() const = 0;
 
-    // The platform handle's flush (true without a handle).
+    // Flushes whatever the device writes through (platform, volume and image handles, members).
+    using cStorage::Flush;
     virtual bool Flush() = 0;
     // Closes the platform handle, and with `withPartitions` the handles of all partitions.
     virtual bool Close(bool withPartitions) = 0;

@@ -45,6 +45,15 @@ public:
     virtual bool WriteBytes(std::uint64_t offset, std::uint64_t length, const void *buffer,
                             std::uint32_t &error) = 0;
 
+    // Waits until everything written through the storage has reached the medium; a write that the
+    // system had taken into its cache and could not place fails here. A write is finished only
+    // after its flush. Storages without a medium below them have nothing to flush.
+    virtual bool Flush(std::uint32_t &error)
+    {
+        error = 0;
+        return true;
+    }
+
 protected:
     cStorage() = default;
     cStorage(const cStorage &) = delete;

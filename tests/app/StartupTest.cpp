@@ -8,6 +8,7 @@
 #include "ClientFramework/Application.h"
 #include "ClientFramework/SingleInstanceGuard.h"
 #include "Kernel/Implementation/KernelVersion.h"
+#include "Kernel/Implementation/Root.h"
 
 #include <QApplication>
 #include <QDir>
@@ -31,6 +32,7 @@ protected:
         o.application = qApp;
         o.instanceKey = key;
         o.runEventLoop = loop;
+        o.kernelReady = [this](CRoot &root) { retries = root.RetryCount(); };
         Solution::Startup startup(o);
         int argc = 1;
         char arg0[] = "brindle";
@@ -42,6 +44,7 @@ protected:
 
     ScratchHome home;
     RecordingDialogs dialogs;
+    int retries = -1; // the kernel's transfer attempts of the last run
     QString key = "brindle-test-" + QUuid::createUuid().toString(QUuid::WithoutBraces);
 };
 
@@ -126,6 +129,13 @@ TEST_F(StartupTest, PreserveWritesSettingsFile)
     const QByteArray xml = TestUtil::readFile(settingsPath());
     EXPECT_TRUE(xml.contains("retries=\"5\"")) << xml.constData();
     EXPECT_TRUE(xml.contains("final-action=\"3\"")) << xml.constData();
+    EXPECT_EQ(retries, 5);
+
+    // The kernel tries a failing sector as often as the command line says, else as stored.
+    EXPECT_EQ(run({"-ra=7"}), 0);
+    EXPECT_EQ(retries, 7);
+    EXPECT_EQ(run({}), 0);
+    EXPECT_EQ(retries, 5);
 }
 
 TEST_F(StartupTest, WithoutArgumentsNoAttributesEntry)

@@ -97,4 +97,66 @@ TEST(CliRead, ImageFileSourceReadsTheVirtualDisk)
     EXPECT_EQ(out.out, data.mid(1000, 3000));
 }
 
+// The opens of a command, as strace sees them: each "openat(..., \"PATH\", FLAGS...)" line.
+QStringList tracedOpens(const QString &cli, const QStringList &args, const QString &log)
+{
+    // The leak checker does not work under a tracer.
+    const TestUtil::ToolResult r =
+        TestUtil::run("strace", QStringList{"-f", "-E", "ASAN_OPTIONS=detect_leaks=0", "-e",
+                                            "trace=open,openat", "-o", log, cli} +
+                                    args);
+    EXPECT_EQ(r.exitCode, 0) << args.join(' ').toStdString() << ": " << r.err.toStdString();
+    QStringList opens;
+    for (const QString &line : QString::fromUtf8(TestUtil::readFile(log)).split('\n'))
+        if (line.contains("open(") || line.contains("openat("))
+            opens << line;
+    return opens;
+}
+
+// Reading commands open the medium they read, and every other disk, for reading only: evidence is
+// never opened writable, and no writable close makes the system announce a change of the device.
+TEST(CliRead, ReadingCommandsNeverOpenTheMediumForWriting)
+{
+    if (!TestUtil::haveTool("strace") || !TestUtil::haveTool("sfdisk") || !TestUtil::haveTool("mkfs.fat"))
+        GTEST_SKIP() << "strace, sfdisk or mkfs.fat is not installed";
+    QTemporaryDir dir;
+    const QString image = dir.filePath("disk.img");
+    ASSERT_TRUE(TestUtil::writeFile(image, QByteArray(8 << 20, 0)));
+    const QString script = dir.filePath("table");
+    ASSERT_TRUE(TestUtil::writeFile(script, "label: dos\nstart=2048, size=12288, type=6\n"));
+    ASSERT_EQ(TestUtil::run("sh", {"-c", "sfdisk -q '" + image + "' < '" + script + "'"}).exitCode, 0);
+    ASSERT_EQ(TestUtil::run("mkfs.fat", {"-F", "16", "-s", "1", "--offset=2048", image, "6144"}).exitCode, 0);
+    const QString cli = TestUtil::builtProgram("brindle-cli");
+
+    auto check = [&](const QString &source) {
+        for (const QStringList &command : {QStringList{"read", source, "--offset", "0", "--length", "1024"},
+                                           QStringList{"partitions", source}, QStringList{"volumes", source},
+                                           QStringList{"template", source, "--type", "1", "--offset", "0"}}) {
+            const QStringList opens = tracedOpens(cli, command, dir.filePath("trace.log"));
+            bool readsSource = false;
+            for (const QString &line : opens) {
+                const int quote = line.indexOf('"');
+                const QString path = line.mid(quote + 1, line.indexOf('"', quote + 1) - quote - 1);
+                const bool medium =
+                    path == source || (path.startsWith("/dev/") && !path.startsWith("/dev/pts/") &&
+                                       !path.startsWith("/dev/tty") && !path.startsWith("/dev/shm/") &&
+                                       path != "/dev/null" && path != "/dev/urandom");
+                if (!medium)
+                    continue;
+                readsSource = readsSource || (path == source && line.contains("O_RDONLY"));
+                EXPECT_FALSE(line.contains("O_RDWR") || line.contains("O_WRONLY"))
+                    << command.join(' ').toStdString() << ": " << line.toStdString();
+            }
+            EXPECT_TRUE(readsSource) << command.join(' ').toStdString() << ": "
+                                     << opens.join('\n').toStdString();
+        }
+    };
+    check(image);
+    if (TestUtil::canAttachLoop()) {
+        TestUtil::LoopDevice loop(image);
+        ASSERT_FALSE(loop.Device().isEmpty());
+        check(loop.Device());
+    }
+}
+
 } // namespace

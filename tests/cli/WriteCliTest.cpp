@@ -3,9 +3,15 @@
 // the end and bad input are refused.
 #include <gtest/gtest.h>
 
+#include <QBuffer>
 #include <QTemporaryDir>
+#include <QTextStream>
 
+#include "Kernel/Implementation/Platform/ScriptedBackend.h"
+#include "Kernel/Implementation/Root.h"
+#include "Kernel/Implementation/SystemError.h"
 #include "TestUtil.h"
+#include "cli/Write.h"
 
 namespace {
 
@@ -75,4 +81,48 @@ TEST(CliWrite, WritesExactlyTheGivenBytes)
     for (int i = 0; i < original.size(); ++i)
         differing += original[i] != expected[i];
     EXPECT_EQ(cmp.out.count('\n'), differing);
+}
+
+// The write is done when it is on the medium: a failed flush, or a medium the system will not open
+// for writing, makes the command fail; the image is opened for writing once, only to write.
+TEST(CliWrite, FailedFlushOrRefusedWriteOpenFailsTheCommand)
+{
+    struct Case
+    {
+        std::uint32_t flushError;
+        std::uint32_t writeOpenError;
+        int exit;
+        const char *message;
+    };
+    const Case cases[] = {
+        {0, 0, Cli::Ok, "wrote 2 bytes at offset 1000"},
+        {SystemError::WriteFault, 0, Cli::Failed,
+         "the written data did not reach the medium (system error 29"},
+        {0, SystemError::AccessDenied, Cli::Failed, "cannot be opened for writing (system error 5"},
+    };
+    for (const Case &c : cases) {
+        ScriptedBackend backend;
+        const QByteArray original = randomBytes(64 * 1024, 7);
+        backend.AddFile("/img/disk.img", original);
+        if (c.writeOpenError)
+            backend.SetWriteOpenError("/img/disk.img", c.writeOpenError);
+        if (c.flushError)
+            backend.ScriptFlush(c.flushError);
+        CRoot root(&backend, nullptr);
+        QString out, err;
+        QTextStream o(&out), e(&err);
+        QBuffer raw;
+        raw.open(QIODevice::WriteOnly);
+        Cli::Io io{o, e, raw};
+        EXPECT_EQ(Cli::runWrite({"/img/disk.img", "--offset", "1000", "--hex", "ABCD", "--yes"}, io, root),
+                  c.exit);
+        o.flush();
+        e.flush();
+        EXPECT_TRUE((out + err).contains(c.message)) << (out + err).toStdString();
+        // A medium the system would not let write is not even tried.
+        EXPECT_EQ(backend.CallCount("open rw /img/disk.img"), c.writeOpenError ? 0 : 1);
+        EXPECT_EQ(backend.CallCount("flush"), c.writeOpenError ? 0 : 1);
+        EXPECT_EQ(backend.FileData("/img/disk.img").mid(1000, 2) == QByteArray("\xAB\xCD", 2),
+                  !c.writeOpenError);
+    }
 }

@@ -1,6 +1,11 @@
 // The framework's command line: prefixing, parse-and-validate messages, reading helpers, "preserve".
 #include "ClientFramework/CLI/Arguments.h"
+#include "ClientFramework/Processing/ErrorHandling.h"
 #include "ClientFramework/Settings/SettingsDocument.h"
+#include "Kernel/Implementation/Platform/PlatformFile.h"
+#include "Kernel/Implementation/Platform/ScriptedBackend.h"
+#include "Kernel/Implementation/Root.h"
+#include "Kernel/Implementation/SystemError.h"
 
 #include <QDomDocument>
 #include <gtest/gtest.h>
@@ -167,4 +172,50 @@ TEST(CliArguments, PreserveLeavesAbsentOptionsAlone)
     EXPECT_EQ(eh.attribute("limit"), "4");
     EXPECT_FALSE(eh.hasAttribute("abort"));
     EXPECT_FALSE(eh.hasAttribute("retries"));
+}
+
+// The stored error handling with the command line over it decides how often the kernel tries a
+// failing sector: counted in reads of the back end.
+TEST(CliArguments, RetryAttemptsReachTheKernelFromTheCommandLineElseTheSettings)
+{
+    struct Case
+    {
+        std::initializer_list<const char *> args;
+        const char *stored; // "retries" of the settings, or null
+        int attempts;
+        bool ignore;
+        int limit;
+    };
+    const Case cases[] = {
+        {{}, nullptr, 2, false, 0},          {{}, "4", 4, false, 0},
+        {{"-ra=5"}, "4", 5, false, 0},       {{"-ra=0"}, nullptr, 1, false, 0},
+        {{"-ie", "-er=3"}, "6", 6, true, 3},
+    };
+    for (const Case &c : cases) {
+        Arguments a(argv(c.args));
+        ASSERT_TRUE(a.commandLineError.isEmpty());
+        QDomDocument doc;
+        QDomElement root = doc.createElement("settings");
+        doc.appendChild(root);
+        if (c.stored)
+            Framework::SettingsDocument::child(Framework::SettingsDocument::child(root, "processing"),
+                                               "error-handling")
+                .setAttribute("retries", c.stored);
+        Framework::Processing::ErrorHandling handling = Framework::Processing::ErrorHandling::stored(root);
+        handling.applyCommandLine();
+        EXPECT_EQ(handling.ignoreRead && handling.ignoreWrite && handling.ignoreLock, c.ignore);
+        EXPECT_EQ(handling.limit, c.limit);
+
+        ScriptedBackend backend;
+        backend.AddFile("/dev/disk0", QByteArray(8192, '\0'));
+        CRoot kernel(&backend, nullptr);
+        kernel.RetryCount(handling.transferAttempts());
+        CPlatformFile disk(&kernel, "/dev/disk0", PlatformKind::Device);
+        for (int i = 0; i < 10; ++i)
+            backend.ScriptRead({SystemError::Crc, -1});
+        QByteArray sector(512, '\0');
+        EXPECT_FALSE(disk.Read(512, 512, sector.data()));
+        EXPECT_EQ(backend.CallCount("read"), c.attempts) << (c.stored ? c.stored : "no setting");
+        disk.Close();
+    }
 }

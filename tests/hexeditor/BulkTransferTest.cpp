@@ -2,6 +2,7 @@
 // copy within one storage over an overlap, refusals, and a stop half-way.
 #include <gtest/gtest.h>
 
+#include <QFile>
 #include <QSignalSpy>
 #include <QTemporaryDir>
 
@@ -40,6 +41,7 @@ TEST(BulkTransfer, SaveSelectionToFileWithUnsavedEdits)
     expected.replace(2000 * 512 + 7 - 1000, 6, "EDITED");
     EXPECT_EQ(TestUtil::readFile(path), expected);
     EXPECT_EQ(medium.writes, 0);
+    EXPECT_FALSE(QFile::exists(path + ".part"));
 }
 
 TEST(BulkTransfer, RefusesBadRequests)
@@ -88,6 +90,16 @@ TEST(BulkTransfer, InsertFromFileWritesTheMediumAndDropsCachedCopies)
     EXPECT_EQ(s.read(DiskArea{333, 1 << 20}), expected.mid(333, 1 << 20));
     // Whole sectors in steps of at most 1024 sectors, partial ends read first.
     EXPECT_LE(medium.writes, 6);
+    EXPECT_EQ(medium.flushes, 1);
+
+    // A transfer whose data does not reach the medium has failed.
+    medium.flushError = 29;
+    std::unique_ptr<Thread> again(Thread::insertFromFile(dir.filePath("in.bin"), &s, 333));
+    ASSERT_EQ(again->prepare(), QString());
+    ASSERT_TRUE(runToEnd(again.get()));
+    EXPECT_FALSE(again->succeeded());
+    EXPECT_TRUE(again->result().startsWith("The data did not reach Memory (Error [29]: "))
+        << again->result().toStdString();
 }
 
 TEST(BulkTransfer, FileLargerThanTheRoomWritesWhatFits)

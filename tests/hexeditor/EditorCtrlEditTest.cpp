@@ -200,6 +200,27 @@ TEST_F(EditorCtrlEdit, FailedSectorWriteKeepsItsEdits)
     EXPECT_TRUE(storage->isModified({3 * 512 + 7, 1}));
     EXPECT_FALSE(storage->isModified({5 * 512, 1}));
     EXPECT_TRUE(ctrl->hasAppliedEdits()); // Save stays possible
+    // The user is told.
+    ASSERT_EQ(dialogs.calls.size(), 2);
+    EXPECT_EQ(dialogs.calls[1].icon, QMessageBox::Critical);
+    EXPECT_EQ(dialogs.calls[1].text,
+              QStringLiteral("The changes to Fake Disk were not saved.\nFailed to write "
+                             "sector 3 to Fake Disk. Error code 29."));
+
+    // Edits that were written but did not reach the medium are not saved either.
+    disk->badWrites.clear();
+    disk->flushError = 29;
+    dialogs.answers = {QMessageBox::Yes};
+    EXPECT_FALSE(ctrl->onSave());
+    EXPECT_TRUE(storage->isModified({3 * 512 + 7, 1}));
+    EXPECT_TRUE(ctrl->hasAppliedEdits());
+    EXPECT_EQ(dialogs.calls.last().icon, QMessageBox::Critical);
+    EXPECT_TRUE(dialogs.calls.last().text.contains("did not reach Fake Disk"))
+        << dialogs.calls.last().text.toStdString();
+    disk->flushError = 0;
+    dialogs.answers = {QMessageBox::Yes};
+    EXPECT_TRUE(ctrl->onSave());
+    EXPECT_FALSE(storage->isModified());
 }
 
 TEST_F(EditorCtrlEdit, RevertRestoresEverything)

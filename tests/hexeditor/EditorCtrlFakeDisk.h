@@ -1,5 +1,6 @@
 // An in-memory disk for the editor control's tests: bytes kept only where written (so a 16 TB disk
-// costs nothing), sectors that fail to read or write on request, and a count of kernel requests.
+// costs nothing), sectors that fail to read or write and a flush that fails on request, and a count
+// of kernel requests.
 #pragma once
 
 #include <QHash>
@@ -45,6 +46,7 @@ public:
 
     QSet<std::uint64_t> badReads;
     QSet<std::uint64_t> badWrites;
+    std::uint32_t flushError = 0; // when not 0, every flush fails with it
     int readRequests = 0;
     int writeRequests = 0;
 
@@ -79,7 +81,7 @@ public:
         const auto *in = static_cast<const char *>(buffer);
         for (std::uint32_t k = 0; k < count; ++k) {
             if (badWrites.contains(first + k)) {
-                error = 5;
+                error = 29;
                 return false;
             }
             m_sectors.insert(first + k, QByteArray(in + std::size_t(k) * m_sectorSize, int(m_sectorSize)));
@@ -100,6 +102,12 @@ public:
         setBytes(offset, QByteArray(static_cast<const char *>(buffer), int(length)));
         error = 0;
         return true;
+    }
+
+    bool Flush(std::uint32_t &error) override
+    {
+        error = flushError;
+        return !error;
     }
 
 private:

@@ -4,6 +4,7 @@
 
 #include <QSignalSpy>
 
+#include "Kernel/Implementation/SystemError.h"
 #include "StorageTestMedium.h"
 #include "hexeditor/FillPattern.h"
 #include "hexeditor/Storage.h"
@@ -203,6 +204,58 @@ TEST(StorageSave, WritesOnlyTheModifiedSectorsWholeAndKeepsFailedOnes)
     EXPECT_EQ(medium.data(), expected);
     EXPECT_FALSE(s.isModified());
     EXPECT_EQ(undo.count(), 0);
+}
+
+// Saved means on the medium: a failed flush keeps every edit written before it, and a medium that
+// cannot be opened for writing is tried once and keeps every edit; either way the edits can be saved
+// again later.
+TEST(StorageSave, FailedFlushOrRefusedWriteOpenKeepsEveryEdit)
+{
+    struct Case
+    {
+        std::uint32_t flushError;
+        std::uint32_t writeError; // of sector 0, the first written
+        int writes;
+        QString message;
+    };
+    const Case cases[] = {
+        {29, 0, 3,
+         "The changes did not reach Memory (Error [29]: The system cannot write to the specified device). "
+         "They "
+         "are kept as not saved."},
+        {0, 19, 1,
+         "Memory cannot be opened for writing (Error [19]: " + systemErrorText(19) +
+             "). Nothing was written; the changes are kept."},
+    };
+    for (const Case &c : cases) {
+        const QByteArray data = patternBytes(32 * 512, 9);
+        MemoryMedium medium(data);
+        Storage s(&medium);
+        UndoStack undo(&s);
+        undo.apply(510, QByteArray("span")); // sectors 0 and 1
+        undo.apply(20 * 512, QByteArray(512, 'z'));
+        const QList<DiskArea> edits = s.modifiedRanges();
+        medium.flushError = c.flushError;
+        if (c.writeError) {
+            medium.badWrites = {0};
+            medium.writeError = c.writeError;
+        }
+        QSignalSpy failed(&s, &Storage::writeFailed);
+        const QList<SaveFailure> failures = undo.save();
+        ASSERT_EQ(failures.size(), 3);
+        for (const SaveFailure &f : failures)
+            EXPECT_EQ(f.message, c.message);
+        EXPECT_EQ(failed.size(), 1);
+        EXPECT_EQ(medium.writes, c.writes);
+        EXPECT_EQ(s.modifiedRanges(), edits);
+        EXPECT_EQ(undo.count(), 2);
+
+        medium.flushError = 0;
+        medium.badWrites.clear();
+        EXPECT_TRUE(undo.save().isEmpty());
+        EXPECT_FALSE(s.isModified());
+        EXPECT_EQ(medium.flushes, c.flushError ? 2 : 1);
+    }
 }
 
 TEST(StorageSave, DirectWriteGoesPastTheCacheAndDropsItsCopy)

@@ -1,5 +1,6 @@
 // A kernel storage in memory for the storage tests: sectors that fail to read or write on
-// request, counters of the kernel requests, and an optional delay per write.
+// request, a flush that fails on request, counters of the kernel requests, and an optional delay
+// per write.
 #pragma once
 
 #include <QByteArray>
@@ -46,7 +47,7 @@ public:
         sectorsWritten += count;
         for (std::uint32_t i = 0; i < count; ++i)
             if (badWrites.count(first + i)) {
-                error = 29;
+                error = writeError;
                 return false;
             }
         return copy(false, first, count, const_cast<void *>(buffer), error);
@@ -66,6 +67,13 @@ public:
         return false;
     }
 
+    bool Flush(std::uint32_t &error) override
+    {
+        ++flushes;
+        error = flushError;
+        return !error;
+    }
+
     QByteArray data() const
     {
         std::lock_guard<std::mutex> lock(m_mutex);
@@ -73,6 +81,9 @@ public:
     }
 
     std::set<std::uint64_t> badReads, badWrites;
+    std::uint32_t writeError = 29; // the error of a bad write
+    std::uint32_t flushError = 0;  // when not 0, every flush fails with it
+    std::atomic<int> flushes{0};
     std::atomic<int> reads{0}, writes{0};
     std::atomic<std::uint64_t> sectorsWritten{0};
     unsigned writeDelayMs = 0;

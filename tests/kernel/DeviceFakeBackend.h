@@ -98,6 +98,11 @@ public:
         error = 1;
         return false;
     }
+    bool Flush(PlatformHandle, std::uint32_t &) override { return true; }
+    bool CanOpenForWriting(const QString &path, std::uint32_t &error) override
+    {
+        return disks.contains(path) || fail(error);
+    }
     bool DeviceControl(PlatformHandle, std::uint32_t code, const void *in, std::uint32_t inSize, void *out,
                        std::uint32_t outSize, std::uint32_t &returned, std::uint32_t &error) override
     {
@@ -112,6 +117,7 @@ public:
     bool GetFreeSpace(const QString &, std::uint64_t &, std::uint32_t &error) override { return fail(error); }
     bool ClearAttributes(const QString &, std::uint32_t &error) override { return fail(error); }
     bool DeleteFile(const QString &, std::uint32_t &error) override { return fail(error); }
+    bool MoveFile(const QString &, const QString &, std::uint32_t &error) override { return fail(error); }
     bool SetMountPoint(const QString &, const QString &, std::uint32_t &error) override
     {
         return fail(error);

@@ -9,6 +9,9 @@
 #include "Implementation/Images/ImageMemorySource.h"
 #include "Implementation/Images/ImageOpen.h"
 #include "Implementation/Images/TarvoWriter.h"
+#include "Implementation/Platform/ScriptedBackend.h"
+#include "Implementation/SystemError.h"
+#include "TestRoot.h"
 
 #include <QFileInfo>
 #include <QTemporaryDir>
@@ -142,6 +145,16 @@ TEST(ImageTarvo, WriterReportsProgressAndCancels)
     };
     EXPECT_FALSE(writer.Write(dir.filePath("f.tdi"), 9, 1000, failing));
     EXPECT_FALSE(QFileInfo::exists(dir.filePath("f.tdi")));
+
+    // An image is made when it is on the medium: one whose flush fails is not left behind.
+    ScriptedBackend backend;
+    TestRoot scripted(&backend);
+    CTarvoWriter onScripted(&scripted, o);
+    backend.ScriptFlush(SystemError::WriteFault);
+    EXPECT_FALSE(onScripted.Write("/img/s.tdi", 9, 1000, readerOf(disk, 9)));
+    EXPECT_FALSE(backend.HasFile("/img/s.tdi"));
+    EXPECT_TRUE(onScripted.Write("/img/s.tdi", 9, 1000, readerOf(disk, 9)));
+    EXPECT_EQ(backend.CallCount("flush /img/s.tdi"), 2);
 }
 
 TEST(ImageTarvo, DamagedHeaderTrailerAndTableAreRefused)

@@ -6,6 +6,9 @@
 #include "Implementation/Images/ImageBytes.h"
 #include "Implementation/Images/ImageHandleVirtualPC.h"
 #include "Implementation/Images/ImageOpen.h"
+#include "Implementation/Platform/ScriptedBackend.h"
+#include "Implementation/SystemError.h"
+#include "TestRoot.h"
 
 #include <QTemporaryDir>
 
@@ -228,4 +231,34 @@ TEST_F(ImageVhd, DamagedFieldsAreRefused)
     char buf[512];
     std::uint32_t error = 0;
     EXPECT_FALSE(handle.ReadWrite(true, 0, 1, buf, error));
+}
+
+// A new block moves the footer past itself: the footer is on the medium before its old place is
+// overwritten, and the table entry before the block is used; a failed flush stops further writes
+// and leaves an image that still opens.
+TEST_F(ImageVhd, BlockAllocationFlushesTheFooterAndTheTable)
+{
+    const QString vhd = convert(QByteArray(8192 * 512, '\0'), "dynamic", "alloc");
+    ScriptedBackend backend;
+    TestRoot scripted(&backend);
+    backend.AddFile("/img/a.vhd", TestUtil::readFile(vhd));
+    CImageHandle_VirtualPC handle(&scripted, {"/img/a.vhd"});
+    ASSERT_TRUE(handle.IsWritable());
+    QByteArray data(512, 'A');
+    std::uint32_t error = 0;
+    backend.ClearCalls();
+    ASSERT_TRUE(handle.ReadWrite(false, 100, 1, data.data(), error)) << error;
+    QStringList order;
+    for (const QString &call : backend.Calls())
+        if (call.startsWith("write") || call.startsWith("flush"))
+            order << call;
+    EXPECT_EQ(order.mid(0, 5),
+              (QStringList{"write 512", "flush /img/a.vhd", "write 512", "write 4", "flush /img/a.vhd"}));
+
+    backend.ScriptFlush(SystemError::WriteFault);
+    EXPECT_FALSE(handle.ReadWrite(false, 5000, 1, data.data(), error));
+    EXPECT_EQ(error, SystemError::WriteFault);
+    EXPECT_FALSE(handle.IsWritable());
+    CImageHandle_VirtualPC again(&scripted, {"/img/a.vhd"});
+    EXPECT_TRUE(again.IsValid()) << again.GetProblem().toStdString();
 }

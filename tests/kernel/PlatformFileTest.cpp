@@ -61,31 +61,101 @@ TEST_F(PlatformFileTest, DestroyingAnOpenHandleReportsAndClosesIt)
     EXPECT_TRUE(backend.HasFile("/tmp/file"));
 }
 
-TEST_F(PlatformFileTest, ReopenTriesReadWriteThenReadOnlyAndCloseRestoresWritable)
+TEST_F(PlatformFileTest, HandlesOpenReadOnlyAndTheFirstWriteReopensForWritingOnce)
 {
-    backend.SetWriteOpenError("/dev/disk0", SystemError::AccessDenied);
+    for (PlatformKind kind : {PlatformKind::Device, PlatformKind::Volume, PlatformKind::File}) {
+        const QString path = kind == PlatformKind::File ? "/tmp/file" : "/dev/disk0";
+        backend.ClearCalls();
+        root.ClearRecords();
+        CPlatformFile handle(&root, path, kind);
+        ASSERT_TRUE(handle.Reopen(true));
+        QByteArray buffer(512, '\0');
+        ASSERT_TRUE(handle.Read(512, 512, buffer.data()));
+        // Asking whether it may write opens nothing for writing.
+        EXPECT_TRUE(handle.IsWritable());
+        EXPECT_EQ(backend.CallCount("open ro " + path), 1);
+        EXPECT_EQ(backend.CallCount("open rw"), 0);
+        ASSERT_EQ(root.debug.size(), 1);
+        EXPECT_EQ(root.debug[0].level, 2u);
+        EXPECT_EQ(root.debug[0].text, "Open: " + path);
+
+        const QByteArray data = pattern(512, 11);
+        ASSERT_TRUE(handle.Write(1024, 512, data.constData()));
+        ASSERT_TRUE(handle.Write(2048, 512, data.constData()));
+        ASSERT_TRUE(handle.Read(1024, 512, buffer.data()));
+        EXPECT_EQ(buffer, data);
+        EXPECT_EQ(backend.CallCount("open rw " + path), 1);
+        EXPECT_EQ(backend.CallCount("close"), 1); // the read-only handle gave way
+        EXPECT_EQ(backend.OpenHandles(), 1);
+
+        // After a close the next open reads only again.
+        ASSERT_TRUE(handle.Close(false));
+        EXPECT_EQ(root.debug.last().text, "Close: " + path);
+        ASSERT_TRUE(handle.Read(0, 512, buffer.data()));
+        EXPECT_EQ(backend.CallCount("open ro " + path), 2);
+        EXPECT_TRUE(handle.Close());
+    }
+}
+
+TEST_F(PlatformFileTest, RefusedWriteOpenFailsTheWriteAndKeepsReading)
+{
+    backend.SetWriteOpenError("/dev/disk0", SystemError::WriteProtect);
     CPlatformFile disk(&root, "/dev/disk0", PlatformKind::Device);
-    ASSERT_TRUE(disk.Reopen(true));
-    EXPECT_EQ(backend.Calls(), (QStringList{"open rw /dev/disk0", "open ro /dev/disk0"}));
     EXPECT_FALSE(disk.IsWritable());
-    EXPECT_EQ(backend.CallCount("control"), 0); // a read-only handle asks nothing
-    EXPECT_TRUE(root.platform.isEmpty());
-    ASSERT_EQ(root.debug.size(), 1);
-    EXPECT_EQ(root.debug[0].level, 2u);
-    EXPECT_EQ(root.debug[0].text, "Open: /dev/disk0");
+    EXPECT_EQ(backend.CallCount("open rw"), 0);
+    const QByteArray before = backend.FileData("/dev/disk0");
+    const QByteArray data = pattern(512, 12);
+    EXPECT_FALSE(disk.Write(0, 512, data.constData()));
+    EXPECT_EQ(disk.GetError(), SystemError::WriteProtect);
+    ASSERT_EQ(root.platform.size(), 1);
+    EXPECT_EQ(root.platform[0].operation, uint32_t(PlatformOperation::CreateFileOpen));
+    EXPECT_EQ(root.platform[0].error, SystemError::WriteProtect);
+    EXPECT_EQ(backend.FileData("/dev/disk0"), before);
+    QByteArray buffer(512, '\0');
+    EXPECT_TRUE(disk.Read(0, 512, buffer.data()));
+    EXPECT_TRUE(disk.IsOpened());
 
-    EXPECT_FALSE(disk.Reopen(true));
-    EXPECT_EQ(root.InternalTexts(), QStringList{"Attempt to reopen non closed file /dev/disk0"});
-
-    ASSERT_TRUE(disk.Close(false));
-    EXPECT_EQ(root.debug.last().level, 3u);
-    EXPECT_EQ(root.debug.last().text, "Close: /dev/disk0");
-    EXPECT_FALSE(disk.IsOpened());
+    // A handle declared read-only refuses writes without asking the system.
+    CPlatformFile file(&root, "/tmp/file", PlatformKind::File);
+    file.SetWritable(false);
     backend.ClearCalls();
-    backend.SetWriteOpenError("/dev/disk0", 0);
-    ASSERT_TRUE(disk.Reopen(false));
-    EXPECT_EQ(backend.Calls(), QStringList{"open rw /dev/disk0"});
+    EXPECT_FALSE(file.Write(0, 512, data.constData()));
+    EXPECT_EQ(file.GetError(), SystemError::AccessDenied);
+    EXPECT_EQ(root.InternalTexts().last(), "Attempt to write read-only handle /tmp/file");
+    EXPECT_EQ(backend.CallCount("open rw"), 0);
     EXPECT_TRUE(disk.Close());
+    EXPECT_FALSE(file.IsOpened());
+}
+
+TEST_F(PlatformFileTest, FlushSendsWhatWasWrittenToTheMediumAndReportsAFailure)
+{
+    for (PlatformKind kind : {PlatformKind::Device, PlatformKind::Volume, PlatformKind::File}) {
+        const QString path = kind == PlatformKind::File ? "/tmp/file" : "/dev/vol0";
+        backend.ClearCalls();
+        root.ClearRecords();
+        CPlatformFile handle(&root, path, kind);
+        uint32_t error = 7;
+        // Nothing written, nothing to flush.
+        EXPECT_TRUE(handle.Flush(error));
+        EXPECT_EQ(error, 0u);
+        QByteArray buffer(512, '\0');
+        ASSERT_TRUE(handle.Read(0, 512, buffer.data()));
+        EXPECT_TRUE(handle.Flush(error));
+        EXPECT_EQ(backend.CallCount("flush"), 0);
+
+        ASSERT_TRUE(handle.Write(0, 512, buffer.constData()));
+        EXPECT_TRUE(handle.Flush(error));
+        EXPECT_EQ(backend.CallCount("flush " + path), 1);
+        backend.ScriptFlush(SystemError::WriteFault);
+        EXPECT_FALSE(handle.Flush(error));
+        EXPECT_EQ(error, SystemError::WriteFault);
+        EXPECT_EQ(handle.GetError(), SystemError::WriteFault);
+        ASSERT_EQ(root.platform.size(), 1);
+        EXPECT_EQ(root.platform[0].operation, uint32_t(PlatformOperation::WriteFile));
+        EXPECT_EQ(root.platform[0].error, SystemError::WriteFault);
+        EXPECT_TRUE(root.InternalTexts().isEmpty());
+        EXPECT_TRUE(handle.Close());
+    }
 }
 
 TEST_F(PlatformFileTest, ReopenFailureIsRecordedOnlyWhenAsked)
@@ -105,7 +175,7 @@ TEST_F(PlatformFileTest, VolumeOpenAsksForExtendedAccessAndIgnoresTheAnswer)
 {
     CPlatformFile volume(&root, "/dev/vol0", PlatformKind::Volume);
     ASSERT_TRUE(volume.Reopen(true));
-    EXPECT_EQ(backend.Calls(), (QStringList{"open rw /dev/vol0", "control 0x90083"}));
+    EXPECT_EQ(backend.Calls(), (QStringList{"open ro /dev/vol0", "control 0x90083"}));
     EXPECT_EQ(volume.GetError(), 0u);
     EXPECT_TRUE(volume.Close());
 }
@@ -242,7 +312,7 @@ TEST_F(PlatformFileTest, MediaChangeOnVolumeReopensOnceAndReadsTheSamePosition)
     QByteArray buffer(512, '\0');
     ASSERT_TRUE(volume.Read(2048, 512, buffer.data()));
     EXPECT_EQ(buffer, backend.FileData("/dev/vol0").mid(2048, 512));
-    EXPECT_EQ(backend.Calls(), (QStringList{"seek 2048", "read 512", "close /dev/vol0", "open rw /dev/vol0",
+    EXPECT_EQ(backend.Calls(), (QStringList{"seek 2048", "read 512", "close /dev/vol0", "open ro /dev/vol0",
                                             "control 0x90083", "seek 2048", "read 512"}));
     EXPECT_TRUE(root.platform.isEmpty());
 
@@ -359,14 +429,11 @@ TEST_F(PlatformFileTest, MisuseByKindAndStateNeverReachesTheSystem)
     CPlatformFile volume(&root, "/dev/vol0", PlatformKind::Volume);
     CPlatformFile file(&root, "/tmp/file", PlatformKind::File);
     uint64_t value = 1;
-    uint32_t error = 1;
     QList<uint64_t> offsets{1};
     EXPECT_FALSE(disk.Create());
     EXPECT_FALSE(disk.GetSize(value));
     EXPECT_EQ(value, 0u);
     EXPECT_FALSE(volume.Resize(10));
-    EXPECT_FALSE(file.Flush(error));
-    EXPECT_EQ(error, 0u);
     EXPECT_FALSE(disk.Lock());
     EXPECT_FALSE(file.Dismount(true));
     EXPECT_FALSE(disk.Unlock());
@@ -381,7 +448,6 @@ TEST_F(PlatformFileTest, MisuseByKindAndStateNeverReachesTheSystem)
                                         "Attempt to create storage file /dev/disk0",
                                         "Attempt to get size of storage file /dev/disk0",
                                         "Attempt to resize storage file /dev/vol0",
-                                        "Attempt to flush for file /tmp/file",
                                         "Attempt to lock non volume handle /dev/disk0",
                                         "Attempt to dismount non volume handle /tmp/file",
                                         "Attempt to unlock non volume handle /dev/disk0",

@@ -90,8 +90,7 @@ TEST(RootEnumerate, DeviceThatCannotBeOpenedIsListedNotReady)
 {
     Fixture f;
     f.backend.AddFile("/dev/sda", Disk(1 << 20, true));
-    // Both the read-write and the read-only open are refused.
-    f.backend.ScriptOpen(SystemError::AccessDenied);
+    // The open (for reading only) is refused.
     f.backend.ScriptOpen(SystemError::AccessDenied);
     EnumCandidate c = Candidate("/dev/sda", 0, EnumSource::PhysicalDrive, 8u << 20);
     c.logicalSectorSize = 4096;

@@ -3,6 +3,8 @@
 #include <gtest/gtest.h>
 
 #include "Kernel/Implementation/Device.h"
+#include "Kernel/Implementation/FS/Volume.h"
+#include "Kernel/Implementation/Images/ImageOpen.h"
 #include "Kernel/Implementation/Platform/PlatformFile.h"
 #include "Kernel/Implementation/Root.h"
 #include "Kernel/Implementation/SystemError.h"
@@ -241,7 +243,6 @@ TEST(Root, AddDevice)
     // Unknown paths are refused; a device without sectors is not added.
     EXPECT_EQ(f.root->AddDevice("/dev/nothing"), nullptr);
     f.backend.ScriptOpen(SystemError::AccessDenied);
-    f.backend.ScriptOpen(SystemError::AccessDenied);
     EXPECT_EQ(f.root->AddDevice("/dev/empty"), nullptr);
     EXPECT_EQ(f.root->GetDeviceCount(), 1u);
     EXPECT_EQ(f.root->FindDeviceByPath("/dev/SDC"), d);
@@ -273,6 +274,55 @@ TEST(Root, AddDevice)
     EXPECT_EQ(f.Codes(), (QList<uint32_t>{2, 3, 4, 1}));
     EXPECT_EQ(f.root->GetDeviceCount(), 2u);
     EXPECT_EQ(f.root->GetDevice(1)->GetDescriptor().diskSequence, 99u);
+}
+
+// Listing a disk, scanning its table, detecting its volume, opening an image and reading them opens
+// nothing for writing (a forensic medium stays untouched, and no writable close makes the system
+// announce a change); the first write opens its medium for writing once, and flushes reach it.
+TEST(Root, OnlyAWriteOpensTheMediumForWriting)
+{
+    RootFixture f;
+    QByteArray disk = Disk(2 << 20, true);
+    disk[0x1BE + 4] = char(0x83);
+    disk[0x1BE + 8] = char(64);    // first sector 64
+    disk[0x1BE + 13] = char(0x08); // 2048 sectors
+    f.backend.AddFile("/dev/sdc", disk);
+    f.backend.AddFile("/img/disk.img", Disk(1 << 20, false));
+    f.source.Set({Candidate("/dev/sdc", 2, EnumSource::PhysicalDrive, 2 << 20)});
+
+    CDevice *device = f.root->AddDevice("/dev/sdc");
+    ASSERT_NE(device, nullptr);
+    CPartition *partition = nullptr;
+    for (std::uint32_t i = 0; i < device->GetPartitionCount(); ++i)
+        if (device->GetPartition(i)->GetStart() == 64)
+            partition = device->GetPartition(i);
+    ASSERT_NE(partition, nullptr);
+    ASSERT_NE(partition->Volume(), nullptr);
+    QString problem;
+    CDevice *image = ImageOpen::OpenImage(f.root.get(), "/img/disk.img", problem);
+    ASSERT_NE(image, nullptr) << problem.toStdString();
+    QByteArray sector(512, '\0');
+    std::uint32_t error = 0;
+    ASSERT_TRUE(partition->Volume()->ReadSectors(0, 1, sector.data(), error));
+    for (CDevice *d : {device, image}) {
+        ASSERT_TRUE(d->ReadSectors(1, 1, sector.data(), error));
+        EXPECT_TRUE(d->IsWritable());
+    }
+    EXPECT_GT(f.backend.CallCount("open ro /dev/sdc"), 0);
+    EXPECT_GT(f.backend.CallCount("open ro /img/disk.img"), 0);
+    EXPECT_EQ(f.backend.CallCount("open rw"), 0) << f.backend.Calls().join('\n').toStdString();
+    EXPECT_EQ(f.backend.CallCount("create"), 0);
+
+    for (const QString &path : {QStringLiteral("/dev/sdc"), QStringLiteral("/img/disk.img")}) {
+        CDevice *d = path == "/dev/sdc" ? device : image;
+        const QByteArray data(512, char(0x5A));
+        ASSERT_TRUE(d->WriteSectors(3, 1, data.constData(), error));
+        ASSERT_TRUE(d->WriteSectors(4, 1, data.constData(), error));
+        EXPECT_EQ(f.backend.CallCount("open rw " + path), 1);
+        EXPECT_EQ(f.backend.FileData(path).mid(3 * 512, 512), data);
+        EXPECT_TRUE(d->Flush(error));
+        EXPECT_EQ(f.backend.CallCount("flush " + path), 1);
+    }
 }
 
 TEST(Root, SettingsKeepTheirOldValueWhenRefused)

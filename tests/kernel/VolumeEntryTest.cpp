@@ -5,6 +5,9 @@
 
 #include <gtest/gtest.h>
 
+#include <utility>
+#include <vector>
+
 namespace {
 
 class CountingEntry : public CEntry
@@ -99,9 +102,71 @@ TEST(VolumeEntry, DataReadsThroughTheRunsOfTheVolume)
     EXPECT_EQ(out[0], char(11));
     EXPECT_EQ(out[423], char(11));
     EXPECT_EQ(out[424], char(0)); // the hole
-    // Reading past the size fills with zeros and fails.
-    EXPECT_FALSE(e.ReadBytes(1000, 200, out.data(), error));
+    // Reading past the last sector fills with zeros and fails.
+    EXPECT_FALSE(e.ReadBytes(1400, 200, out.data(), error));
     EXPECT_EQ(out[199], char(0));
+}
+
+// Every sector of a file reads, the last one with zeros after the size (not what lies after it in
+// its cluster), and writing it changes only the file's bytes; past the last sector nothing reads.
+TEST(VolumeEntry, LastPartialSectorReadsTheFileThenZerosAndWritesOnlyTheFile)
+{
+    struct Case
+    {
+        std::uint64_t size;
+        std::vector<std::pair<std::uint64_t, std::uint64_t>> runs; // (cluster or sparse, clusters)
+    };
+    const Case cases[] = {
+        {0, {}},          {1, {{10, 1}}},   {511, {{10, 1}}},
+        {512, {{10, 1}}}, {513, {{10, 1}}}, {2500, {{10, 1}, {CEntryHandle::Sparse, 1}, {20, 1}}},
+    };
+    for (const Case &c : cases) {
+        SCOPED_TRACE(c.size);
+        QByteArray bytes(64 * 512, 0);
+        for (int i = 0; i < bytes.size(); ++i)
+            bytes[i] = static_cast<char>(i % 251 + 1);
+        MemoryStorage medium(bytes);
+        VolumeDescription d;
+        d.size = bytes.size();
+        CVolume volume(&medium, d);
+        CEntry e(&volume, nullptr, "file", 10, 0);
+        e.GetHandle().SetUnitShift(10); // clusters of two sectors: a file ends inside one
+        for (const auto &run : c.runs)
+            e.GetHandle().AddRun(run.first, run.second);
+        e.SetSize(c.size);
+        // The file's byte at an offset as the runs place it on the medium.
+        auto fileByte = [&](std::uint64_t offset, const QByteArray &on) {
+            std::uint64_t at = 0;
+            for (const auto &run : c.runs) {
+                if (offset < at + run.second * 1024)
+                    return run.first == CEntryHandle::Sparse ? char(0)
+                                                             : on[int(run.first * 1024 + offset - at)];
+                at += run.second * 1024;
+            }
+            return char(0);
+        };
+        const std::uint64_t sectors = (c.size + 511) / 512;
+        ASSERT_EQ(e.GetTotalSectors(), sectors);
+        QByteArray all(int(sectors * 512), 'x');
+        std::uint32_t error = 0;
+        EXPECT_TRUE(e.ReadSectors(0, std::uint32_t(sectors), all.data(), error));
+        for (std::uint64_t i = 0; i < sectors * 512; ++i)
+            ASSERT_EQ(all[int(i)], i < c.size ? fileByte(i, bytes) : char(0)) << "byte " << i;
+        QByteArray past(512, 'x');
+        EXPECT_FALSE(e.ReadSectors(sectors, 1, past.data(), error));
+        EXPECT_EQ(past, QByteArray(512, 0));
+        if (!sectors)
+            continue;
+
+        // The last sector written whole: the file's bytes change, the rest of its cluster does not.
+        const QByteArray sector(512, char(0xEE));
+        ASSERT_TRUE(e.WriteSectors(sectors - 1, 1, sector.constData(), error));
+        for (std::uint64_t i = (sectors - 1) * 512; i < c.runs.size() * 1024; ++i) {
+            const char expected = i < c.size ? char(0xEE) : fileByte(i, bytes);
+            ASSERT_EQ(fileByte(i, medium.Bytes()), expected) << "byte " << i;
+        }
+        EXPECT_FALSE(e.WriteSectors(sectors, 1, sector.constData(), error));
+    }
 }
 
 } // namespace

@@ -130,29 +130,53 @@ std::uint64_t CEntry::GetTotalSectors() const
     return (GetSize() + bps - 1) / bps;
 }
 
+std::uint64_t CEntry::SectorsEnd() const
+{
+    const std::uint64_t size = GetSize();
+    const std::uint64_t bps = GetBytesPerSector();
+    const std::uint64_t tail = size % bps;
+    if (!tail)
+        return size;
+    return size > ~0ull - (bps - tail) ? ~0ull : size + (bps - tail);
+}
+
 bool CEntry::ReadBytes(std::uint64_t offset, std::uint64_t length, void *buffer, std::uint32_t &error)
 {
     error = 0;
     EnsureRuns();
     const std::uint64_t size = GetSize();
-    if (offset > size)
-        return false;
-    const std::uint64_t have = std::min(length, size - offset);
+    const std::uint64_t have = offset >= size ? 0 : std::min(length, size - offset);
     // Bytes the runs do not cover (an entry larger than its allocation) read as zeros.
     const std::uint64_t mapped =
         offset >= m_handle.GetTotalBytes() ? 0 : std::min(have, m_handle.GetTotalBytes() - offset);
     if (mapped > 0 && !m_handle.Read(offset, mapped, buffer, error))
         return false;
+    // The last sector goes on past the size with zeros (what lies there on the medium is not the
+    // entry's); past the last sector nothing is there and the read fails after the zeros.
     if (length > mapped)
         std::memset(static_cast<std::uint8_t *>(buffer) + mapped, 0, length - mapped);
-    return have == length;
+    const std::uint64_t end = SectorsEnd();
+    return offset <= end && length <= end - offset;
 }
 
 bool CEntry::WriteBytes(std::uint64_t offset, std::uint64_t length, const void *buffer, std::uint32_t &error)
 {
     error = 0;
     EnsureRuns();
-    return m_handle.Write(offset, length, buffer, error);
+    const std::uint64_t end = SectorsEnd();
+    if (offset > end || length > end - offset)
+        return false;
+    // Only the entry's own bytes reach the medium: the zeros after its size in the last sector
+    // would overwrite whatever lies there.
+    const std::uint64_t size = GetSize();
+    const std::uint64_t inside = offset >= size ? 0 : std::min(length, size - offset);
+    return inside == 0 || m_handle.Write(offset, inside, buffer, error);
+}
+
+bool CEntry::Flush(std::uint32_t &error)
+{
+    error = 0;
+    return !m_volume || m_volume->Flush(error);
 }
 
 bool CEntry::ReadSectors(std::uint64_t first, std::uint32_t count, void *buffer, std::uint32_t &error)

@@ -51,6 +51,8 @@ public:
     bool ReadBytes(std::uint64_t offset, std::uint64_t length, void *buffer, std::uint32_t &error) override;
     bool WriteBytes(std::uint64_t offset, std::uint64_t length, const void *buffer,
                     std::uint32_t &error) override;
+    // The volume's flush.
+    bool Flush(std::uint32_t &error) override;
 
     // cEntry
     QString GetName() const override;
@@ -91,6 +93,8 @@ protected:
     virtual void LoadRuns() {}
 
 private:
+    // Where the entry's last sector ends, in bytes.
+    std::uint64_t SectorsEnd() const;
     void EnsureChildren();
     void EnsureRuns();
 

@@ -324,6 +324,9 @@ bool CVolume::Transfer(bool read, std::uint64_t first, std::uint32_t count, std:
         }
         if (!ok)
             error = m_handle->GetError();
+        // The unlock closes the handle: what it wrote must be on the medium before.
+        if (ok && !read && lockHere)
+            ok = m_handle->Flush(error);
         if (lockHere)
             m_handle->Unlock();
     } else if (!m_medium) {
@@ -386,6 +389,14 @@ bool CVolume::ReadBytes(std::uint64_t offset, std::uint64_t length, void *buffer
         length -= part;
     }
     return true;
+}
+
+bool CVolume::Flush(std::uint32_t &error)
+{
+    error = 0;
+    if (m_handle && !m_handle->Flush(error))
+        return false;
+    return !m_medium || m_medium->Flush(error);
 }
 
 bool CVolume::WriteBytes(std::uint64_t offset, std::uint64_t length, const void *buffer, std::uint32_t &error)

@@ -89,6 +89,8 @@ public:
     bool ReadBytes(std::uint64_t offset, std::uint64_t length, void *buffer, std::uint32_t &error) override;
     bool WriteBytes(std::uint64_t offset, std::uint64_t length, const void *buffer,
                     std::uint32_t &error) override;
+    // The volume's own handle and the medium below.
+    bool Flush(std::uint32_t &error) override;
 
     // cVolume
     QString GetName() const override { return m_name; }

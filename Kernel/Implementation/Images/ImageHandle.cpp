@@ -5,6 +5,8 @@
 #include "Implementation/SystemError.h"
 #include "Implementation/cRoot.h"
 
+#include <QMutexLocker>
+
 CImageHandle::CImageHandle(cRoot *root, ImageKind kind, std::uint8_t sectorShift)
     : m_root(root), m_kind(kind), m_sectorShift(sectorShift)
 {
@@ -30,6 +32,21 @@ void CImageHandle::Describe(DeviceInfo &info) const
 bool CImageHandle::IsWritable() const
 {
     return m_writable != 0 && m_totalSectors != 0;
+}
+
+bool CImageHandle::Flush(std::uint32_t &error)
+{
+    QMutexLocker locker(&m_lock);
+    error = 0;
+    bool ok = true;
+    for (CPlatformFile *f : m_files) {
+        std::uint32_t e = 0;
+        if (!f->Flush(e) && ok) {
+            ok = false;
+            error = e;
+        }
+    }
+    return ok;
 }
 
 QStringList CImageHandle::GetFileNames() const

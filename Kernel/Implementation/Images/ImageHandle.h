@@ -30,6 +30,8 @@ public:
     // leaves the file's system error in `error`; a format failure leaves error 0.
     virtual bool ReadWrite(bool read, std::uint64_t first, std::uint32_t count, void *buffer,
                            std::uint32_t &error) = 0;
+    // Flushes every image file that was written.
+    virtual bool Flush(std::uint32_t &error);
     // Fills what the image knows of its source disk into a device descriptor (geometry, model,
     // serial); the base sets the sector shift and size only.
     virtual void Describe(DeviceInfo &info) const;

@@ -324,6 +324,7 @@ bool CImageHandle_VirtualPC::AllocateBlock(std::uint32_t block, std::uint32_t &e
                 writable = 0;
         }
     } guard{m_writable};
+    error = 0;
     const std::uint64_t blockStart = m_footerStart; // the new block takes the footer's place
     if (blockStart / 512 >= Unallocated) {
         error = SystemError::DiskFull;
@@ -336,13 +337,13 @@ bool CImageHandle_VirtualPC::AllocateBlock(std::uint32_t block, std::uint32_t &e
 
     if (grown > m_fileLimit && inLast > 0) {
         // A further file holds the block and the footer; the footer leaves the old last file
-        // only after the new one is complete.
+        // only after the new one is complete and on the medium.
         QString name = OverflowName(m_files.first()->GetName(), int(m_files.size()));
         auto *file = new CPlatformFile(m_root, name, PlatformKind::File);
         const std::uint64_t size = 512 + BlockSize + FooterSize;
         if (!file->Create() || !file->Resize(512 + BlockSize) ||
-            !file->Write(512 + BlockSize, FooterSize, m_footer)) {
-            error = file->GetError();
+            !file->Write(512 + BlockSize, FooterSize, m_footer) || !file->Flush(error)) {
+            error = error ? error : file->GetError();
             if (file->IsOpened())
                 file->Close(true);
             delete file;
@@ -357,11 +358,12 @@ bool CImageHandle_VirtualPC::AllocateBlock(std::uint32_t block, std::uint32_t &e
         SetFileSize(last, inLast);
         AdoptFile(file, size);
     } else {
-        // The footer first goes to its new place past the block; the block (a zero bitmap and
-        // zero data, a hole in the file) then takes the old footer's place.
+        // The footer first goes to its new place past the block and reaches the medium; only then
+        // does the block (a zero bitmap and zero data, a hole in the file) take the old footer's
+        // place, so the image keeps a footer whatever is interrupted.
         CPlatformFile *file = m_files[last];
-        if (!file->Write(inLast + 512 + BlockSize, FooterSize, m_footer)) {
-            error = file->GetError();
+        if (!file->Write(inLast + 512 + BlockSize, FooterSize, m_footer) || !file->Flush(error)) {
+            error = error ? error : file->GetError();
             return false;
         }
         SetFileSize(last, grown);
@@ -374,7 +376,8 @@ bool CImageHandle_VirtualPC::AllocateBlock(std::uint32_t block, std::uint32_t &e
     const std::uint32_t entry = std::uint32_t(blockStart / 512);
     std::uint8_t be[4];
     putBe32(be, entry);
-    if (!TransferBytes(false, m_tableOffset + std::uint64_t(block) * 4, 4, be, error))
+    // The allocation is complete when the table entry is on the medium.
+    if (!TransferBytes(false, m_tableOffset + std::uint64_t(block) * 4, 4, be, error) || !Flush(error))
         return false;
     m_bat[block] = entry;
     guard.done = true;

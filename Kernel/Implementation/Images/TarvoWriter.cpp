@@ -205,7 +205,9 @@ bool CTarvoWriter::Write(const QString &path, std::uint8_t sectorShift, std::uin
     std::uint8_t trailer[Tarvo::TrailerSize];
     putLe64(trailer, (std::uint64_t(adler) << 32) | Tarvo::Adler(1, header, sizeof header));
     putLe64(trailer + 8, Tarvo::TrailerMagic);
-    if (!out.Append(trailer, sizeof trailer) || !out.Flush())
+    // The image is complete only when all of it is on the medium.
+    std::uint32_t flushError = 0;
+    if (!out.Append(trailer, sizeof trailer) || !out.Flush() || !file.Flush(flushError))
         return failWrite();
     m_written = out.Position();
     if (!file.Close(false)) {

@@ -51,6 +51,13 @@ public:
     virtual bool GetFileSize(PlatformHandle handle, uint64_t &size, uint32_t &error) = 0;
     // Cuts or extends the file at the current position.
     virtual bool SetEndOfFile(PlatformHandle handle, uint32_t &error) = 0;
+    // Sends what was written through the handle to the medium and waits for it: a write that the
+    // system kept in its cache and could not place fails here.
+    virtual bool Flush(PlatformHandle handle, uint32_t &error) = 0;
+
+    // Whether the process would be let open path for writing, asked without opening it (a
+    // write-protected medium, a read-only mount or missing rights answer with the system error).
+    virtual bool CanOpenForWriting(const QString &path, uint32_t &error) = 0;
 
     // A device control (DeviceControl.h codes and layouts); returned is the byte count of the answer,
     // also given on failure.
@@ -62,6 +69,8 @@ public:
 
     virtual bool ClearAttributes(const QString &path, uint32_t &error) = 0;
     virtual bool DeleteFile(const QString &path, uint32_t &error) = 0;
+    // Gives a file another name, replacing a file of that name.
+    virtual bool MoveFile(const QString &from, const QString &to, uint32_t &error) = 0;
 
     // Mounts the volume at a mount point ("%1:\" for a drive letter) and removes a mount point.
     virtual bool SetMountPoint(const QString &mountPoint, const QString &volumeName, uint32_t &error) = 0;

@@ -115,6 +115,50 @@ bool CPlatformFile::EnsureOpen()
     return Reopen(true);
 }
 
+QString CPlatformFile::OpenPath() const
+{
+    return m_kind == PlatformKind::File ? NativePath(m_name, Backend().Paths()) : m_name;
+}
+
+bool CPlatformFile::EnsureWriteAccess()
+{
+    if (m_writeOpen)
+        return true;
+    if (!m_writable) {
+        m_error = SystemError::AccessDenied;
+        Internal(QStringLiteral("Attempt to write read-only handle %1").arg(m_name));
+        return false;
+    }
+    IPlatformBackend &backend = Backend();
+    uint32_t error = 0;
+    const PlatformHandle h = backend.Open(OpenPath(), false, false, error);
+    if (h == NullPlatformHandle) {
+        m_error = error;
+        Record(PlatformOperation::CreateFileOpen, 0, 0, error);
+        return false;
+    }
+    if (m_handle != NullPlatformHandle) {
+        // A file's reads at the current position go on where the read-only handle stood.
+        uint64_t position = 0, reached = 0;
+        const bool carry = m_kind == PlatformKind::File && SyncPosition(error) &&
+                           backend.SetPosition(m_handle, 0, SeekOrigin::Current, position, error);
+        if (!backend.Close(m_handle, error))
+            Record(PlatformOperation::CloseHandle, 0, 0, error);
+        if (carry)
+            backend.SetPosition(h, int64_t(position), SeekOrigin::Begin, reached, error);
+    }
+    m_handle = h;
+    m_writeOpen = true;
+    m_positionPending = false;
+    if (m_kind == PlatformKind::Volume) {
+        uint32_t returned = 0, ignored = 0;
+        backend.DeviceControl(h, DeviceControl::FSCTL_ALLOW_EXTENDED_DASD_IO, nullptr, 0, nullptr, 0,
+                              returned, ignored);
+    }
+    Debug(__LINE__, 2, QStringLiteral("Open: ") + m_name);
+    return true;
+}
+
 QString CPlatformFile::GetName()
 {
     QMutexLocker guard(&m_lock);
@@ -126,6 +170,12 @@ bool CPlatformFile::IsWritable()
     QMutexLocker guard(&m_lock);
     if (!m_writable)
         return false;
+    // Whether a write open would be let through, asked without making one.
+    if (!m_writeOpen) {
+        uint32_t error = 0;
+        if (!Backend().CanOpenForWriting(OpenPath(), error))
+            return false;
+    }
     if (m_kind != PlatformKind::Device && m_kind != PlatformKind::Volume)
         return true;
     if (!DIOC(DeviceControl::IOCTL_DISK_IS_WRITABLE, nullptr, 0, nullptr, 0))
@@ -184,6 +234,7 @@ bool CPlatformFile::Create()
         return false;
     }
     m_handle = h;
+    m_writeOpen = true;
     Debug(__LINE__, 2, QStringLiteral("Create: ") + m_name);
     return true;
 }
@@ -196,30 +247,22 @@ bool CPlatformFile::Reopen(bool report)
         Internal(QStringLiteral("Attempt to reopen non closed file %1").arg(m_name));
         return false;
     }
+    // Reading needs no more: a write opens the handle again for writing when it comes.
     IPlatformBackend &backend = Backend();
-    const QString path = m_kind == PlatformKind::File ? NativePath(m_name, backend.Paths()) : m_name;
     uint32_t error = 0;
-    if (m_writable) {
-        PlatformHandle h = backend.Open(path, false, false, error);
-        if (h != NullPlatformHandle) {
-            m_handle = h;
-            if (m_kind == PlatformKind::Volume) {
-                uint32_t returned = 0, ignored = 0;
-                backend.DeviceControl(h, DeviceControl::FSCTL_ALLOW_EXTENDED_DASD_IO, nullptr, 0, nullptr, 0,
-                                      returned, ignored);
-            }
-        }
+    const PlatformHandle h = backend.Open(OpenPath(), true, false, error);
+    if (h == NullPlatformHandle) {
+        m_error = error;
+        if (report)
+            Record(PlatformOperation::CreateFileOpen, 0, 0, error);
+        return false;
     }
-    if (m_handle == NullPlatformHandle) {
-        PlatformHandle h = backend.Open(path, true, false, error);
-        if (h == NullPlatformHandle) {
-            m_error = error;
-            if (report)
-                Record(PlatformOperation::CreateFileOpen, 0, 0, error);
-            return false;
-        }
-        m_handle = h;
-        m_writable = 0;
+    m_handle = h;
+    m_writeOpen = false;
+    if (m_kind == PlatformKind::Volume) {
+        uint32_t returned = 0, ignored = 0;
+        backend.DeviceControl(h, DeviceControl::FSCTL_ALLOW_EXTENDED_DASD_IO, nullptr, 0, nullptr, 0,
+                              returned, ignored);
     }
     Debug(__LINE__, 2, QStringLiteral("Open: ") + m_name);
     return true;
@@ -255,7 +298,8 @@ bool CPlatformFile::Resize(uint64_t newSize)
         Internal(QStringLiteral("Attempt to resize storage file %1").arg(m_name));
         return false;
     }
-    if (!EnsureOpen())
+    // Resizing writes the file.
+    if (!EnsureWriteAccess())
         return false;
     uint32_t error = 0;
     uint64_t position = 0;
@@ -364,7 +408,8 @@ bool CPlatformFile::ReadWrite(bool read, uint64_t pos, uint32_t size, void *buff
     using Result = IPlatformBackend::TransferResult;
     QMutexLocker guard(&m_lock);
     m_error = 0;
-    if (!EnsureOpen())
+    // A closed handle that is to write opens for writing straight away.
+    if (m_handle == NullPlatformHandle && !(read || m_lost ? Reopen(true) : EnsureWriteAccess()))
         return false;
     if (m_kind == PlatformKind::File && pos == CurrentPosition) {
         if (!(read ? GetPosition(pos) : GetSize(pos)))
@@ -387,6 +432,10 @@ bool CPlatformFile::ReadWrite(bool read, uint64_t pos, uint32_t size, void *buff
     uint32_t attempts = 0;
     bool reopened = false;
     for (;;) {
+        // A handle opened (or opened again after a media change) for reading gives way to one that
+        // may write; a refusal fails the write with the system's answer.
+        if (!read && !EnsureWriteAccess())
+            return false;
         uint32_t done = 0;
         const Result result = Attempt(backend, read, pos, size, buffer, done);
         if (result == Result::PositionFailed) {
@@ -438,16 +487,21 @@ bool CPlatformFile::ReadWrite(bool read, uint64_t pos, uint32_t size, void *buff
 bool CPlatformFile::Flush(uint32_t &error)
 {
     QMutexLocker guard(&m_lock);
-    if (m_kind == PlatformKind::File) {
-        Internal(QStringLiteral("Attempt to flush for file %1").arg(m_name));
-        error = 0;
-        return false;
-    }
+    m_error = 0;
     if (m_lost) {
-        error = m_lost;
+        m_error = error = m_lost;
         return false;
     }
     error = 0;
+    // A handle that never wrote has nothing on its way to the medium.
+    if (m_handle == NullPlatformHandle || !m_writeOpen)
+        return true;
+    if (!Backend().Flush(m_handle, error)) {
+        m_error = error;
+        // What failed is writing: the data did not reach the medium.
+        Record(PlatformOperation::WriteFile, 0, 0, error);
+        return false;
+    }
     return true;
 }
 
@@ -463,7 +517,8 @@ bool CPlatformFile::Lock()
         Internal(QStringLiteral("Attempt to lock locked volume handle %1").arg(m_name));
         return false;
     }
-    if (!EnsureOpen())
+    // The lock stays with the handle: one that will write is opened for writing first.
+    if (m_writable ? !EnsureWriteAccess() : !EnsureOpen())
         return false;
     if (!DIOC(DeviceControl::FSCTL_LOCK_VOLUME, nullptr, 0, nullptr, 0))
         return false;
@@ -634,8 +689,8 @@ bool CPlatformFile::Close(bool deleteFile)
         Record(PlatformOperation::CloseHandle, 0, 0, error);
         return false;
     }
-    m_writable = 1;
     m_handle = NullPlatformHandle;
+    m_writeOpen = false;
     m_positionPending = false;
     Debug(__LINE__, 3, QStringLiteral("Close: ") + m_name);
     if (m_kind == PlatformKind::File && deleteFile) {

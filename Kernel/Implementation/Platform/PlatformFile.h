@@ -1,5 +1,7 @@
 // A handle on a physical drive, an optical drive, a mounted volume or an ordinary file: the kernel's
 // only door to the operating system's storage. Every operation takes the handle's recursive lock.
+// A handle opens for reading only; the first write (or the lock of a volume that may be written)
+// opens it again for writing, so nothing that only reads ever holds a medium writable.
 #pragma once
 
 #include "PlatformBackend.h"
@@ -103,6 +105,11 @@ public:
 protected:
     IPlatformBackend &Backend() const;
     bool EnsureOpen();
+    // Exchanges a read-only handle for one that may write (opening it when closed); false with the
+    // error, the read-only handle kept, when writing is not allowed or the system refuses.
+    bool EnsureWriteAccess();
+    // The path the back end opens.
+    QString OpenPath() const;
     void Internal(const QString &text) const;
     void Debug(uint32_t line, uint32_t level, const QString &text) const;
     void Record(PlatformOperation op, uint64_t position, uint64_t block, uint32_t error) const;
@@ -117,8 +124,11 @@ protected:
     QString m_name;
     PlatformHandle m_handle = NullPlatformHandle;
     uint32_t m_error = 0;
+    // 1: writes are allowed (the first one opens the handle for writing); 0: the handle only reads.
     uint8_t m_writable = 1;
     uint8_t m_locked = 0;
+    // The open handle has write access.
+    bool m_writeOpen = false;
     uint32_t m_lost = 0;
 
 private:

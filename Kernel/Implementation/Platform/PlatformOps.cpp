@@ -64,6 +64,17 @@ bool PlatformDeleteFile(cRoot *owner, const QString &name)
     return true;
 }
 
+bool PlatformMoveFile(cRoot *owner, const QString &from, const QString &to)
+{
+    IPlatformBackend &backend = backendOf(owner);
+    uint32_t error = 0;
+    if (!backend.MoveFile(NativePath(from, backend.Paths()), NativePath(to, backend.Paths()), error)) {
+        record(owner, PlatformOperation::MoveFile, from, error);
+        return false;
+    }
+    return true;
+}
+
 bool AssignDriveLetter(cRoot *owner, const QString &volumeName, uint32_t letterIndex)
 {
     if (letterIndex >= 26)
@@ -127,7 +138,8 @@ bool WriteTextFile(cRoot *owner, const QString &path, const QStringList &lines)
     CPlatformFile file(owner, path, PlatformKind::File);
     if (!file.Create())
         return false;
-    if (!file.Write(0, uint32_t(data.size()), data.constData())) {
+    uint32_t flushError = 0;
+    if (!file.Write(0, uint32_t(data.size()), data.constData()) || !file.Flush(flushError)) {
         file.Close(true);
         return false;
     }

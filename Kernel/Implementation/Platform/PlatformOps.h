@@ -18,6 +18,8 @@ QString NativePath(const QString &path);
 
 // Clears the attributes of a file, then deletes it; either failing sends record 27.
 bool PlatformDeleteFile(cRoot *owner, const QString &name);
+// Renames a file, replacing one of the new name; failure sends record 28.
+bool PlatformMoveFile(cRoot *owner, const QString &from, const QString &to);
 
 // Mounts a volume at the drive letter 'A' + index; fails without a call for an index of 26 or more.
 bool AssignDriveLetter(cRoot *owner, const QString &volumeName, uint32_t letterIndex);

@@ -81,6 +81,12 @@ void ScriptedBackend::ScriptClose(uint32_t error)
     m_closeScript.push_back(error);
 }
 
+void ScriptedBackend::ScriptFlush(uint32_t error)
+{
+    QMutexLocker guard(&m_mutex);
+    m_flushScript.push_back(error);
+}
+
 void ScriptedBackend::ScriptControl(uint32_t code, const Control &answer)
 {
     QMutexLocker guard(&m_mutex);
@@ -366,6 +372,46 @@ bool ScriptedBackend::SetEndOfFile(PlatformHandle handle, uint32_t &error)
     return true;
 }
 
+bool ScriptedBackend::Flush(PlatformHandle handle, uint32_t &error)
+{
+    QMutexLocker guard(&m_mutex);
+    auto it = m_open.find(handle);
+    log(QStringLiteral("flush %1").arg(it == m_open.end() ? QString() : it->second.path));
+    if (it == m_open.end()) {
+        error = SystemError::InvalidHandle;
+        return false;
+    }
+    if (!m_flushScript.empty()) {
+        const uint32_t scripted = m_flushScript.front();
+        m_flushScript.pop_front();
+        if (scripted) {
+            error = scripted;
+            return false;
+        }
+    }
+    if (const uint32_t gone = vanishedError(it->second)) {
+        error = gone;
+        return false;
+    }
+    return true;
+}
+
+bool ScriptedBackend::CanOpenForWriting(const QString &path, uint32_t &error)
+{
+    QMutexLocker guard(&m_mutex);
+    log(QStringLiteral("may write %1").arg(path));
+    auto it = m_files.find(path);
+    if (it == m_files.end() || it->second.vanished) {
+        error = SystemError::FileNotFound;
+        return false;
+    }
+    if (it->second.writeOpenError) {
+        error = it->second.writeOpenError;
+        return false;
+    }
+    return true;
+}
+
 bool ScriptedBackend::DeviceControl(PlatformHandle handle, uint32_t code, const void *in, uint32_t inSize,
                                     void *out, uint32_t outSize, uint32_t &returned, uint32_t &error)
 {
@@ -467,6 +513,21 @@ bool ScriptedBackend::DeleteFile(const QString &path, uint32_t &error)
         error = SystemError::FileNotFound;
         return false;
     }
+    return true;
+}
+
+bool ScriptedBackend::MoveFile(const QString &from, const QString &to, uint32_t &error)
+{
+    QMutexLocker guard(&m_mutex);
+    log(QStringLiteral("move %1 %2").arg(from, to));
+    auto it = m_files.find(from);
+    if (it == m_files.end()) {
+        error = SystemError::FileNotFound;
+        return false;
+    }
+    Entry entry = it->second;
+    m_files.erase(it);
+    m_files[to] = entry;
     return true;
 }
 

@@ -55,6 +55,7 @@ public:
     void ScriptWrite(const Transfer &step);
     void ScriptSeek(uint32_t error);
     void ScriptClose(uint32_t error);
+    void ScriptFlush(uint32_t error);
     void ScriptControl(uint32_t code, const Control &answer);
     // Answer of a device control whenever no scripted answer is left (default: error 1).
     void SetControlHandler(uint32_t code, ControlHandler handler);
@@ -64,8 +65,9 @@ public:
     void SetDeleteError(uint32_t error);
 
     // The log of calls ("open rw NAME", "open ro NAME", "create NAME", "close NAME", "seek POS", "read SIZE",
-    // "write SIZE", "size", "eof", "control 0xCODE", "free PATH", "attributes PATH", "delete PATH",
-    // "mount MP VOL", "unmount MP"), and its count of entries starting with a prefix.
+    // "write SIZE", "size", "eof", "flush NAME", "may write NAME", "control 0xCODE", "free PATH",
+    // "attributes PATH", "delete PATH", "move FROM TO", "mount MP VOL", "unmount MP"), and its count of
+    // entries starting with a prefix.
     QStringList Calls() const;
     int CallCount(const QString &prefix) const;
     void ClearCalls();
@@ -80,11 +82,14 @@ public:
                uint32_t &error) override;
     bool GetFileSize(PlatformHandle handle, uint64_t &size, uint32_t &error) override;
     bool SetEndOfFile(PlatformHandle handle, uint32_t &error) override;
+    bool Flush(PlatformHandle handle, uint32_t &error) override;
+    bool CanOpenForWriting(const QString &path, uint32_t &error) override;
     bool DeviceControl(PlatformHandle handle, uint32_t code, const void *in, uint32_t inSize, void *out,
                        uint32_t outSize, uint32_t &returned, uint32_t &error) override;
     bool GetFreeSpace(const QString &path, uint64_t &freeBytes, uint32_t &error) override;
     bool ClearAttributes(const QString &path, uint32_t &error) override;
     bool DeleteFile(const QString &path, uint32_t &error) override;
+    bool MoveFile(const QString &from, const QString &to, uint32_t &error) override;
     bool SetMountPoint(const QString &mountPoint, const QString &volumeName, uint32_t &error) override;
     bool DeleteMountPoint(const QString &mountPoint, uint32_t &error) override;
     QString ErrorText(uint32_t code) override;
@@ -114,7 +119,7 @@ private:
     std::map<QString, Entry> m_files;
     std::map<PlatformHandle, OpenFile> m_open;
     PlatformHandle m_next = 3;
-    std::deque<uint32_t> m_openScript, m_seekScript, m_closeScript;
+    std::deque<uint32_t> m_openScript, m_seekScript, m_closeScript, m_flushScript;
     std::deque<Transfer> m_readScript, m_writeScript;
     std::map<uint32_t, std::deque<Control>> m_controlScript;
     std::map<uint32_t, ControlHandler> m_controlHandlers;

@@ -318,6 +318,30 @@ bool LinuxBackend::SetEndOfFile(PlatformHandle handle, uint32_t &error)
     return true;
 }
 
+bool LinuxBackend::Flush(PlatformHandle handle, uint32_t &error)
+{
+    // Only the data and what is needed to read it back: the medium's own contents are what counts.
+    int result;
+    do {
+        result = ::fdatasync(fdOf(handle));
+    } while (result != 0 && errno == EINTR);
+    if (result != 0) {
+        error = errnoToFlushError(errno);
+        return false;
+    }
+    return true;
+}
+
+bool LinuxBackend::CanOpenForWriting(const QString &path, uint32_t &error)
+{
+    // The rights of the effective user, and a read-only mount, as an open would meet them.
+    if (::faccessat(AT_FDCWD, pathBytes(path).constData(), W_OK, AT_EACCESS) != 0) {
+        error = errnoToSystemError(errno);
+        return false;
+    }
+    return true;
+}
+
 bool LinuxBackend::DeviceControl(PlatformHandle handle, uint32_t code, const void *in, uint32_t inSize,
                                  void *out, uint32_t outSize, uint32_t &returned, uint32_t &error)
 {
@@ -372,6 +396,15 @@ bool LinuxBackend::ClearAttributes(const QString &path, uint32_t &error)
 bool LinuxBackend::DeleteFile(const QString &path, uint32_t &error)
 {
     if (::unlink(pathBytes(path).constData()) != 0) {
+        error = errnoToSystemError(errno);
+        return false;
+    }
+    return true;
+}
+
+bool LinuxBackend::MoveFile(const QString &from, const QString &to, uint32_t &error)
+{
+    if (::rename(pathBytes(from).constData(), pathBytes(to).constData()) != 0) {
         error = errnoToSystemError(errno);
         return false;
     }

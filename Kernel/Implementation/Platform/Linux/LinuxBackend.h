@@ -29,11 +29,14 @@ public:
     bool TransfersKeepPosition() const override { return true; }
     bool GetFileSize(PlatformHandle handle, uint64_t &size, uint32_t &error) override;
     bool SetEndOfFile(PlatformHandle handle, uint32_t &error) override;
+    bool Flush(PlatformHandle handle, uint32_t &error) override;
+    bool CanOpenForWriting(const QString &path, uint32_t &error) override;
     bool DeviceControl(PlatformHandle handle, uint32_t code, const void *in, uint32_t inSize, void *out,
                        uint32_t outSize, uint32_t &returned, uint32_t &error) override;
     bool GetFreeSpace(const QString &path, uint64_t &freeBytes, uint32_t &error) override;
     bool ClearAttributes(const QString &path, uint32_t &error) override;
     bool DeleteFile(const QString &path, uint32_t &error) override;
+    bool MoveFile(const QString &from, const QString &to, uint32_t &error) override;
     bool SetMountPoint(const QString &mountPoint, const QString &volumeName, uint32_t &error) override;
     bool DeleteMountPoint(const QString &mountPoint, uint32_t &error) override;
     QString ErrorText(uint32_t code) override;
