@@ -1,2 +1,2 @@
 // The identity is header-only; this unit gives the framework library its first object file.
-#include "AppIdentity.h"
+#include "ClientFramework/AppIdentity.h"

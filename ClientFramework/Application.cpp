@@ -1,9 +1,9 @@
-#include "Application.h"
+#include "ClientFramework/Application.h"
 
-#include "AppIdentity.h"
-#include "CLI/Arguments.h"
-#include "Log/ApplicationLog.h"
-#include "Settings/SettingsDocument.h"
+#include "ClientFramework/AppIdentity.h"
+#include "ClientFramework/CLI/Arguments.h"
+#include "ClientFramework/Log/ApplicationLog.h"
+#include "ClientFramework/Settings/SettingsDocument.h"
 
 #include <QApplication>
 

@@ -2,7 +2,7 @@
 // persistent components, and what the run recorded (errors, warnings, the final action).
 #pragma once
 
-#include "Settings/PersistenceXML.h"
+#include "ClientFramework/Settings/PersistenceXML.h"
 
 #include <QList>
 #include <QObject>

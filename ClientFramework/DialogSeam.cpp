@@ -1,6 +1,6 @@
-#include "DialogSeam.h"
+#include "ClientFramework/DialogSeam.h"
 
-#include "Help/PopupDlg.h"
+#include "ClientFramework/Help/PopupDlg.h"
 
 #include <atomic>
 

@@ -1,7 +1,7 @@
-#include "GenericError.h"
+#include "ClientFramework/GenericError.h"
 
-#include "DialogSeam.h"
-#include "Log/ApplicationLog.h"
+#include "ClientFramework/DialogSeam.h"
+#include "ClientFramework/Log/ApplicationLog.h"
 
 #include <QCoreApplication>
 #include <QMessageBox>

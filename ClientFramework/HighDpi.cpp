@@ -1,4 +1,4 @@
-#include "HighDpi.h"
+#include "ClientFramework/HighDpi.h"
 
 #include <QByteArray>
 #include <QCoreApplication>

@@ -1,4 +1,4 @@
-#include "Privileges.h"
+#include "ClientFramework/Privileges.h"
 
 #include <grp.h>
 #include <unistd.h>

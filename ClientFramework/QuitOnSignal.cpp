@@ -1,4 +1,4 @@
-#include "QuitOnSignal.h"
+#include "ClientFramework/QuitOnSignal.h"
 
 #include <QCoreApplication>
 #include <QSocketNotifier>

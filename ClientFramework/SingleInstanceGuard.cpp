@@ -1,4 +1,4 @@
-#include "SingleInstanceGuard.h"
+#include "ClientFramework/SingleInstanceGuard.h"
 
 #include <QCryptographicHash>
 #include <QDir>

@@ -1,4 +1,4 @@
-#include "CliArguments.h"
+#include "app/CliArguments.h"
 
 #include "ClientFramework/AppIdentity.h"
 #include "ClientFramework/DialogSeam.h"

@@ -1,4 +1,4 @@
-#include "Commander.h"
+#include "app/Commander.h"
 
 #include <QHash>
 

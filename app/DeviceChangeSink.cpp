@@ -1,11 +1,11 @@
-#include "DeviceChangeSink.h"
+#include "app/DeviceChangeSink.h"
 
 #include "ClientFramework/NodeTree/NodeComputer.h"
 #include "ClientFramework/NodeTree/NodeDevice.h"
 #include "ClientFramework/NodeTree/NodeRoot.h"
-#include "Kernel/Implementation/Device.h"
+#include "Kernel/Implementation/Devices/Device.h"
 #include "Kernel/Implementation/Platform/PlatformFile.h"
-#include "Kernel/Implementation/Root.h"
+#include "Kernel/Implementation/Root/Root.h"
 
 namespace Solution {
 

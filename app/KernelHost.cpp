@@ -1,6 +1,6 @@
-#include "KernelHost.h"
+#include "app/KernelHost.h"
 
-#include "MainView.h"
+#include "app/MainView.h"
 
 #include <QApplication>
 #include <QDir>
@@ -15,10 +15,10 @@
 #include "ClientFramework/NodeTree/NodePartition.h"
 #include "ClientFramework/NodeTree/NodeRoot.h"
 #include "ClientFramework/Views/MainView.h"
-#include "Kernel/Implementation/Device.h"
+#include "Kernel/Implementation/Devices/Device.h"
 #include "Kernel/Implementation/Images/ImageHandle.h"
-#include "Kernel/Implementation/Images/ImageOpen.h"
-#include "Kernel/Implementation/Root.h"
+#include "Kernel/Implementation/Root/ImageOpen.h"
+#include "Kernel/Implementation/Root/Root.h"
 #include "hexeditor/Commander.h"
 
 namespace CLI {

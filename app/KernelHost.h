@@ -3,7 +3,7 @@
 // start offset, files by path, and the request that opens a node in the hex editor.
 #pragma once
 
-#include "RequestHost.h"
+#include "app/RequestHost.h"
 
 #include <QPointer>
 

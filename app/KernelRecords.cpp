@@ -1,9 +1,9 @@
-#include "KernelRecords.h"
+#include "app/KernelRecords.h"
 
 #include "ClientFramework/Log/KernelLog.h"
 
+#include "Kernel/Implementation/Common/SystemError.h"
 #include "Kernel/Implementation/Platform/PlatformFile.h"
-#include "Kernel/Implementation/SystemError.h"
 
 #include <QRegularExpression>
 

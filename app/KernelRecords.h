@@ -4,7 +4,7 @@
 // an error and every other misuse record a warning, as before.
 #pragma once
 
-#include "Kernel/Implementation/KernelEvents.h"
+#include "Kernel/Implementation/Common/KernelEvents.h"
 
 class cRoot;
 

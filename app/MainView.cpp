@@ -1,8 +1,8 @@
-#include "MainView.h"
+#include "app/MainView.h"
 
-#include "Commander.h"
-#include "DeviceChangeSink.h"
-#include "NodeCommands.h"
+#include "app/Commander.h"
+#include "app/DeviceChangeSink.h"
+#include "app/NodeCommands.h"
 
 #include "ClientFramework/DeviceChange/DeviceChangeHandler.h"
 #include "ClientFramework/NodeTree/NodeDevice.h"
@@ -12,7 +12,7 @@
 #include "ClientFramework/Views/PropertyPane.h"
 #include "ClientFramework/Views/SmartPane.h"
 #include "Kernel/Implementation/Platform/Linux/UdevMonitor.h"
-#include "Kernel/Implementation/Root.h"
+#include "Kernel/Implementation/Root/Root.h"
 
 #include "ClientFramework/AppIdentity.h"
 #include "ClientFramework/CLI/Arguments.h"

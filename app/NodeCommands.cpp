@@ -1,4 +1,4 @@
-#include "NodeCommands.h"
+#include "app/NodeCommands.h"
 
 #include "ClientFramework/Commands/Commander.h"
 #include "ClientFramework/NodeTree/DiskBrowserModel.h"
@@ -9,10 +9,10 @@
 #include "ClientFramework/Views/UserPrompts.h"
 #include "ClientFramework/Views/WindowManager.h"
 
-#include "Kernel/Implementation/Device.h"
+#include "Kernel/Implementation/Devices/Device.h"
 #include "Kernel/Implementation/FS/Entry.h"
 #include "Kernel/Implementation/Images/ImageHandle.h"
-#include "Kernel/Implementation/Partition.h"
+#include "Kernel/Implementation/Partitions/Partition.h"
 
 #include <QAbstractItemView>
 #include <QApplication>

@@ -1,6 +1,6 @@
-#include "ProcessingAction.h"
+#include "app/ProcessingAction.h"
 
-#include "RequestHost.h"
+#include "app/RequestHost.h"
 
 #include "ClientFramework/AppIdentity.h"
 #include "ClientFramework/Application.h"

@@ -1,12 +1,12 @@
-#include "Startup.h"
+#include "app/Startup.h"
 
-#include "CliArguments.h"
-#include "Commander.h"
-#include "KernelHost.h"
-#include "KernelRecords.h"
-#include "MainView.h"
-#include "ProcessingAction.h"
-#include "RequestHost.h"
+#include "app/CliArguments.h"
+#include "app/Commander.h"
+#include "app/KernelHost.h"
+#include "app/KernelRecords.h"
+#include "app/MainView.h"
+#include "app/ProcessingAction.h"
+#include "app/RequestHost.h"
 
 #include "ClientFramework/AppIdentity.h"
 #include "ClientFramework/Application.h"
@@ -19,8 +19,8 @@
 #include "ClientFramework/Settings/SettingsDocument.h"
 #include "ClientFramework/Views/RecentFiles.h"
 
-#include "Kernel/Implementation/KernelVersion.h"
-#include "Kernel/Implementation/Root.h"
+#include "Kernel/Implementation/Common/KernelVersion.h"
+#include "Kernel/Implementation/Root/Root.h"
 
 #include <QApplication>
 #include <QDateTime>

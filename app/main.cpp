@@ -1,5 +1,5 @@
 // The desktop program's entry point.
-#include "Startup.h"
+#include "app/Startup.h"
 
 int main(int argc, char **argv)
 {

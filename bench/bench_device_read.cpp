@@ -7,9 +7,9 @@
 #include <memory>
 #include <vector>
 
-#include "Kernel/Implementation/Device.h"
+#include "Kernel/Implementation/Devices/Device.h"
 #include "Kernel/Implementation/Platform/PlatformFile.h"
-#include "Kernel/Implementation/Root.h"
+#include "Kernel/Implementation/Root/Root.h"
 
 namespace {
 

@@ -9,7 +9,7 @@
 #include <cstring>
 #include <memory>
 
-#include "Kernel/Implementation/cStorage.h"
+#include "Kernel/Implementation/Common/cStorage.h"
 #include "hexeditor/EditorCtrl.h"
 #include "hexeditor/Storage.h"
 

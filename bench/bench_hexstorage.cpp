@@ -12,7 +12,7 @@
 
 #include <cstdlib>
 
-#include "Kernel/Implementation/Root.h"
+#include "Kernel/Implementation/Root/Root.h"
 #include "hexeditor/StorageFactory.h"
 
 namespace {

@@ -12,7 +12,7 @@
 #include <cstdlib>
 
 #include "Kernel/Implementation/Platform/PlatformFile.h"
-#include "Kernel/Implementation/Root.h"
+#include "Kernel/Implementation/Root/Root.h"
 
 namespace {
 

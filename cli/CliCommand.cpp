@@ -1,14 +1,14 @@
-#include "CliCommand.h"
+#include "cli/CliCommand.h"
 
-#include "Devices.h"
-#include "HwInfo.h"
-#include "Image.h"
-#include "Partitions.h"
-#include "Read.h"
-#include "Template.h"
-#include "Version.h"
-#include "Write.h"
-#include "Volumes.h"
+#include "cli/Devices.h"
+#include "cli/HwInfo.h"
+#include "cli/Image.h"
+#include "cli/Partitions.h"
+#include "cli/Read.h"
+#include "cli/Template.h"
+#include "cli/Version.h"
+#include "cli/Volumes.h"
+#include "cli/Write.h"
 
 namespace Cli {
 

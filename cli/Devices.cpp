@@ -1,8 +1,8 @@
-#include "Devices.h"
+#include "cli/Devices.h"
 
-#include "Kernel/Implementation/Device.h"
+#include "Kernel/Implementation/Devices/Device.h"
 #include "Kernel/Implementation/Platform/PlatformFile.h"
-#include "Kernel/Implementation/Root.h"
+#include "Kernel/Implementation/Root/Root.h"
 
 #include <QJsonArray>
 #include <QJsonDocument>

@@ -1,7 +1,7 @@
 // brindle-cli devices [--json]: the kernel's devices in kernel order.
 #pragma once
 
-#include "CliCommand.h"
+#include "cli/CliCommand.h"
 
 #include <QJsonObject>
 

@@ -1,10 +1,10 @@
-#include "HwInfo.h"
+#include "cli/HwInfo.h"
 
-#include "Version.h"
+#include "cli/Version.h"
 
-#include "Kernel/Implementation/HardwareInfo.h"
-#include "Kernel/Implementation/Root.h"
-#include "Kernel/Implementation/SystemError.h"
+#include "Kernel/Implementation/Common/SystemError.h"
+#include "Kernel/Implementation/Report/HardwareInfo.h"
+#include "Kernel/Implementation/Root/Root.h"
 
 namespace Cli {
 

@@ -1,7 +1,7 @@
 // brindle-cli hwinfo FILE: the hardware-information report of this machine.
 #pragma once
 
-#include "CliCommand.h"
+#include "cli/CliCommand.h"
 
 namespace Cli {
 

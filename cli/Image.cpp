@@ -1,8 +1,8 @@
-#include "Image.h"
+#include "cli/Image.h"
 
-#include "Kernel/Implementation/Images/ImageOpen.h"
-#include "Kernel/Implementation/Root.h"
-#include "Source.h"
+#include "Kernel/Implementation/Root/ImageOpen.h"
+#include "Kernel/Implementation/Root/Root.h"
+#include "cli/Source.h"
 
 namespace Cli {
 

@@ -1,12 +1,12 @@
 // brindle-cli image create: an own-format image of a device, partition source or image file.
-#include "Image.h"
+#include "cli/Image.h"
 
 #include <QElapsedTimer>
 
-#include "Kernel/Implementation/Device.h"
+#include "Kernel/Implementation/Devices/Device.h"
 #include "Kernel/Implementation/Images/TarvoWriter.h"
-#include "Kernel/Implementation/Root.h"
-#include "Source.h"
+#include "Kernel/Implementation/Root/Root.h"
+#include "cli/Source.h"
 
 namespace Cli {
 

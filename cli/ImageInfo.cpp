@@ -1,12 +1,12 @@
 // brindle-cli image info: what an image file holds, identified from its content.
-#include "Image.h"
+#include "cli/Image.h"
 
 #include <QJsonArray>
 #include <QJsonDocument>
 #include <QJsonObject>
 
 #include "Kernel/Implementation/Images/ImageHandleTarvo.h"
-#include "Kernel/Implementation/Images/ImageOpen.h"
+#include "Kernel/Implementation/Root/ImageOpen.h"
 
 namespace Cli {
 

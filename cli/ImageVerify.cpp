@@ -1,8 +1,8 @@
 // brindle-cli image verify: inflates every block of an own-format image and checks its sums.
-#include "Image.h"
+#include "cli/Image.h"
 
 #include "Kernel/Implementation/Images/ImageHandleTarvo.h"
-#include "Kernel/Implementation/Images/ImageOpen.h"
+#include "Kernel/Implementation/Root/ImageOpen.h"
 
 namespace Cli {
 

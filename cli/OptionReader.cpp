@@ -1,6 +1,6 @@
-#include "OptionReader.h"
+#include "cli/OptionReader.h"
 
-#include "Number.h"
+#include "cli/Number.h"
 
 namespace Cli {
 

@@ -1,4 +1,4 @@
-#include "Partitions.h"
+#include "cli/Partitions.h"
 
 #include <QFileInfo>
 #include <QJsonArray>
@@ -9,10 +9,10 @@
 
 #include <vector>
 
-#include "Kernel/Implementation/Device.h"
-#include "Kernel/Implementation/GptReader.h"
-#include "Kernel/Implementation/Root.h"
-#include "Source.h"
+#include "Kernel/Implementation/Devices/Device.h"
+#include "Kernel/Implementation/Partitions/GptReader.h"
+#include "Kernel/Implementation/Root/Root.h"
+#include "cli/Source.h"
 
 namespace Cli {
 

@@ -4,7 +4,7 @@
 
 #include <QStringList>
 
-#include "CliCommand.h"
+#include "cli/CliCommand.h"
 
 namespace Cli {
 

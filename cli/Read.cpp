@@ -1,13 +1,13 @@
-#include "Read.h"
+#include "cli/Read.h"
 
 #include <QIODevice>
 #include <vector>
 
-#include "Kernel/Implementation/Device.h"
-#include "Kernel/Implementation/HexDump.h"
-#include "Kernel/Implementation/Root.h"
-#include "OptionReader.h"
-#include "Source.h"
+#include "Kernel/Implementation/Devices/Device.h"
+#include "Kernel/Implementation/Report/HexDump.h"
+#include "Kernel/Implementation/Root/Root.h"
+#include "cli/OptionReader.h"
+#include "cli/Source.h"
 
 namespace Cli {
 

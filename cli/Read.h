@@ -3,7 +3,7 @@
 
 #include <QStringList>
 
-#include "CliCommand.h"
+#include "cli/CliCommand.h"
 
 namespace Cli {
 

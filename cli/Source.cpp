@@ -1,8 +1,8 @@
-#include "Source.h"
+#include "cli/Source.h"
 
-#include "Kernel/Implementation/Device.h"
-#include "Kernel/Implementation/Root.h"
-#include "Kernel/Implementation/RootEnumSource.h"
+#include "Kernel/Implementation/Common/RootEnumSource.h"
+#include "Kernel/Implementation/Devices/Device.h"
+#include "Kernel/Implementation/Root/Root.h"
 
 #include <QFileInfo>
 

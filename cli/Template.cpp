@@ -1,12 +1,12 @@
-#include "Template.h"
+#include "cli/Template.h"
 
 #include <QJsonDocument>
 
-#include "Kernel/Implementation/Device.h"
-#include "Kernel/Implementation/Root.h"
-#include "OptionReader.h"
-#include "Source.h"
-#include "TemplateSource.h"
+#include "Kernel/Implementation/Devices/Device.h"
+#include "Kernel/Implementation/Root/Root.h"
+#include "cli/OptionReader.h"
+#include "cli/Source.h"
+#include "cli/TemplateSource.h"
 #include "hexeditor/templates/core/Catalog.h"
 #include "hexeditor/templates/core/Record.h"
 #include "hexeditor/templates/core/TreeText.h"

@@ -1,4 +1,4 @@
-#include "TemplateSource.h"
+#include "cli/TemplateSource.h"
 
 namespace Cli {
 

@@ -1,7 +1,7 @@
 // A template source over a kernel storage: byte reads bounded by the storage's size.
 #pragma once
 
-#include "Kernel/Implementation/cStorage.h"
+#include "Kernel/Implementation/Common/cStorage.h"
 #include "hexeditor/templates/core/Source.h"
 
 namespace Cli {

@@ -1,6 +1,6 @@
-#include "Version.h"
+#include "cli/Version.h"
 
-#include "Kernel/Implementation/KernelVersion.h"
+#include "Kernel/Implementation/Common/KernelVersion.h"
 
 namespace Cli {
 

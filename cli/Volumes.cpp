@@ -1,4 +1,4 @@
-#include "Volumes.h"
+#include "cli/Volumes.h"
 
 #include <QJsonArray>
 #include <QJsonDocument>
@@ -7,11 +7,11 @@
 
 #include <vector>
 
-#include "Kernel/Implementation/Device.h"
+#include "Kernel/Implementation/Devices/Device.h"
 #include "Kernel/Implementation/FS/Volume.h"
 #include "Kernel/Implementation/FS/VolumeIntegrity.h"
-#include "Kernel/Implementation/Root.h"
-#include "Source.h"
+#include "Kernel/Implementation/Root/Root.h"
+#include "cli/Source.h"
 
 namespace Cli {
 

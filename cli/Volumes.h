@@ -5,7 +5,7 @@
 
 #include <QStringList>
 
-#include "CliCommand.h"
+#include "cli/CliCommand.h"
 
 namespace Cli {
 

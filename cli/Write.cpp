@@ -1,14 +1,14 @@
-#include "Write.h"
+#include "cli/Write.h"
 
 #include <QFile>
 
 #include <cctype>
 
-#include "Kernel/Implementation/Device.h"
-#include "Kernel/Implementation/Root.h"
-#include "Kernel/Implementation/SystemError.h"
-#include "OptionReader.h"
-#include "Source.h"
+#include "Kernel/Implementation/Common/SystemError.h"
+#include "Kernel/Implementation/Devices/Device.h"
+#include "Kernel/Implementation/Root/Root.h"
+#include "cli/OptionReader.h"
+#include "cli/Source.h"
 #include "hexeditor/StorageSectorWrite.h"
 #include "hexeditor/StorageWriteGuard.h"
 

@@ -5,7 +5,7 @@
 
 #include <cstdio>
 
-#include "CliCommand.h"
+#include "cli/CliCommand.h"
 
 int main(int argc, char **argv)
 {

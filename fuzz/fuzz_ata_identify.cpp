@@ -5,8 +5,8 @@
 #include <cstring>
 #include <vector>
 
-#include "Kernel/Implementation/AtaCommand.h"
-#include "Kernel/Implementation/AtaIdentify.h"
+#include "Kernel/Implementation/Ata/AtaCommand.h"
+#include "Kernel/Implementation/Ata/AtaIdentify.h"
 
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t *data, size_t size)
 {

@@ -1,12 +1,12 @@
 // Detection and volume creation over arbitrary partition contents: the probe sequence, the
 // classifier, the ZFS label and UDF checks, the BSD disk label, every volume class, the integrity
 // listing and the packed run lists.
+#include "Kernel/Implementation/Common/cStorage.h"
+#include "Kernel/Implementation/Devices/VolumeCreate.h"
 #include "Kernel/Implementation/FS/Detect.h"
 #include "Kernel/Implementation/FS/EntryHandle.h"
-#include "Kernel/Implementation/FS/VolumeCreate.h"
 #include "Kernel/Implementation/FS/VolumeIntegrity.h"
-#include "Kernel/Implementation/Partition.h"
-#include "Kernel/Implementation/cStorage.h"
+#include "Kernel/Implementation/Partitions/Partition.h"
 
 #include <QByteArray>
 

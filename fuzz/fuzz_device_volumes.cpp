@@ -6,11 +6,11 @@
 #include <memory>
 #include <vector>
 
-#include "Implementation/Device.h"
-#include "Implementation/FS/Volume.h"
-#include "Implementation/Images/ImageHandle.h"
-#include "Implementation/Images/ImageMemorySource.h"
-#include "Implementation/Images/ImageOpen.h"
+#include "Kernel/Implementation/Devices/Device.h"
+#include "Kernel/Implementation/FS/Volume.h"
+#include "Kernel/Implementation/Images/ImageHandle.h"
+#include "Kernel/Implementation/Images/ImageMemorySource.h"
+#include "Kernel/Implementation/Root/ImageOpen.h"
 
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t *data, size_t size)
 {

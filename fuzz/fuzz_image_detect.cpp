@@ -4,9 +4,9 @@
 #include <cstdint>
 #include <vector>
 
-#include "Implementation/Images/ImageHandle.h"
-#include "Implementation/Images/ImageMemorySource.h"
-#include "Implementation/Images/ImageOpen.h"
+#include "Kernel/Implementation/Images/ImageHandle.h"
+#include "Kernel/Implementation/Images/ImageMemorySource.h"
+#include "Kernel/Implementation/Root/ImageOpen.h"
 
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t *data, size_t size)
 {

@@ -4,8 +4,8 @@
 #include <cstdint>
 #include <vector>
 
-#include "Implementation/Images/ImageHandleVMWare.h"
-#include "Implementation/Images/ImageMemorySource.h"
+#include "Kernel/Implementation/Images/ImageHandleVMWare.h"
+#include "Kernel/Implementation/Images/ImageMemorySource.h"
 
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t *data, size_t size)
 {

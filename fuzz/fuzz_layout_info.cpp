@@ -1,10 +1,10 @@
 // The drive layout answer of a device, as GetLayoutInfo reads it: arbitrary answer bytes, counts and
 // buffer-size refusals.
-#include "Implementation/Platform/DeviceControl.h"
-#include "Implementation/Platform/PlatformFile.h"
-#include "Implementation/Platform/ScriptedBackend.h"
-#include "Implementation/SystemError.h"
-#include "Implementation/cRoot.h"
+#include "Kernel/Implementation/Common/SystemError.h"
+#include "Kernel/Implementation/Common/cRoot.h"
+#include "Kernel/Implementation/Platform/DeviceControl.h"
+#include "Kernel/Implementation/Platform/PlatformFile.h"
+#include "Kernel/Implementation/Platform/ScriptedBackend.h"
 
 #include <QByteArray>
 #include <QList>

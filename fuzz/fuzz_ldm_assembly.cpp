@@ -7,7 +7,7 @@
 #include <cstring>
 #include <vector>
 
-#include "Kernel/Implementation/LdmAssembly.h"
+#include "Kernel/Implementation/Devices/LdmAssembly.h"
 
 namespace {
 

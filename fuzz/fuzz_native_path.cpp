@@ -1,5 +1,5 @@
 // NativePath on arbitrary text, in both path conventions.
-#include "Implementation/Platform/PlatformOps.h"
+#include "Kernel/Implementation/Platform/PlatformOps.h"
 
 #include <QString>
 

@@ -5,8 +5,8 @@
 
 #include <QByteArray>
 
-#include "Kernel/Implementation/PartScan.h"
-#include "Kernel/Implementation/PartScanMemory.h"
+#include "Kernel/Implementation/Partitions/PartScan.h"
+#include "Kernel/Implementation/Partitions/PartScanMemory.h"
 
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t *data, size_t size)
 {

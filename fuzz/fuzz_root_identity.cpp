@@ -9,7 +9,7 @@
 #include <QString>
 
 #include "Kernel/Implementation/Platform/Linux/SysfsEnumerate.h"
-#include "Kernel/Implementation/RootIdentity.h"
+#include "Kernel/Implementation/Root/RootIdentity.h"
 
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t *data, size_t size)
 {

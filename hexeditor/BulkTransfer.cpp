@@ -1,4 +1,4 @@
-#include "BulkTransfer.h"
+#include "hexeditor/BulkTransfer.h"
 
 #include <QDir>
 #include <QFile>
@@ -9,11 +9,11 @@
 #include <algorithm>
 #include <cstring>
 
+#include "Kernel/Implementation/Common/SystemError.h"
 #include "Kernel/Implementation/Platform/PlatformFile.h"
 #include "Kernel/Implementation/Platform/PlatformOps.h"
-#include "Kernel/Implementation/SystemError.h"
-#include "StorageSectorWrite.h"
-#include "StorageWriteGuard.h"
+#include "hexeditor/StorageSectorWrite.h"
+#include "hexeditor/StorageWriteGuard.h"
 
 namespace HexEditor::BulkTransfer {
 

@@ -19,8 +19,8 @@
 #include <cstdint>
 
 #include "ClientFramework/Threads/Generic.h"
-#include "DiskArea.h"
-#include "Storage.h"
+#include "hexeditor/DiskArea.h"
+#include "hexeditor/Storage.h"
 
 namespace HexEditor::BulkTransfer {
 

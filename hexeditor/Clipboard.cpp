@@ -1,4 +1,4 @@
-#include "Clipboard.h"
+#include "hexeditor/Clipboard.h"
 
 #include <QCoreApplication>
 #include <QDataStream>
@@ -9,7 +9,7 @@
 #include <QMutexLocker>
 #include <QSet>
 
-#include "Layout.h"
+#include "hexeditor/Layout.h"
 
 namespace HexEditor::Clipboard {
 

@@ -8,8 +8,8 @@
 
 #include <cstdint>
 
-#include "DiskArea.h"
-#include "Metrics.h"
+#include "hexeditor/DiskArea.h"
+#include "hexeditor/Metrics.h"
 
 class QMimeData;
 

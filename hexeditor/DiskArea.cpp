@@ -1,2 +1,2 @@
 // DiskArea is header-only; this unit gives the hex-editor library its first object file.
-#include "DiskArea.h"
+#include "hexeditor/DiskArea.h"

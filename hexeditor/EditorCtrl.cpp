@@ -1,4 +1,4 @@
-#include "EditorCtrl.h"
+#include "hexeditor/EditorCtrl.h"
 
 #include <QHelpEvent>
 #include <QMenu>
@@ -8,10 +8,10 @@
 
 #include <algorithm>
 
-#include "Clipboard.h"
-#include "Paint.h"
-#include "Storage.h"
-#include "StorageFile.h"
+#include "hexeditor/Clipboard.h"
+#include "hexeditor/Paint.h"
+#include "hexeditor/Storage.h"
+#include "hexeditor/StorageFile.h"
 
 namespace HexEditor {
 

@@ -16,12 +16,12 @@
 #include <memory>
 
 #include "ClientFramework/Settings/PersistenceXML.h"
-#include "DiskArea.h"
-#include "Metrics.h"
-#include "NavigationPoint.h"
-#include "PaintPalette.h"
-#include "Storage.h" // declares DiskArea as a meta type
-#include "UndoStack.h"
+#include "hexeditor/DiskArea.h"
+#include "hexeditor/Metrics.h"
+#include "hexeditor/NavigationPoint.h"
+#include "hexeditor/PaintPalette.h"
+#include "hexeditor/Storage.h" // declares DiskArea as a meta type
+#include "hexeditor/UndoStack.h"
 
 class QMenu;
 class QAction;

@@ -1,7 +1,7 @@
 // Editing through the editor control: typed digits and characters, applied edits with undo and
 // redo, revert, save with its confirmation, Delete, fill block, the clipboard, template changes and
 // the questions before closing or switching a file's mode.
-#include "EditorCtrl.h"
+#include "hexeditor/EditorCtrl.h"
 
 #include <QApplication>
 #include <QClipboard>
@@ -15,9 +15,9 @@
 
 #include "ClientFramework/AppIdentity.h"
 #include "ClientFramework/DialogSeam.h"
-#include "Clipboard.h"
-#include "FillBlockDlg.h"
-#include "Storage.h"
+#include "hexeditor/Clipboard.h"
+#include "hexeditor/FillBlockDlg.h"
+#include "hexeditor/Storage.h"
 
 namespace HexEditor {
 

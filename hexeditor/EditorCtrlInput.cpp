@@ -1,5 +1,5 @@
 // Keyboard and mouse input of the editor control: caret moves, selections, auto-scroll and wheel.
-#include "EditorCtrl.h"
+#include "hexeditor/EditorCtrl.h"
 
 #include <QKeyEvent>
 #include <QMouseEvent>
@@ -8,8 +8,8 @@
 
 #include <algorithm>
 
-#include "Paint.h"
-#include "Storage.h"
+#include "hexeditor/Paint.h"
+#include "hexeditor/Storage.h"
 
 namespace HexEditor {
 

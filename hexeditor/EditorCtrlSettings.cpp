@@ -1,5 +1,5 @@
 // The editor control's settings: the "hex-editor" element with its "font" and "viewport" children.
-#include "EditorCtrl.h"
+#include "hexeditor/EditorCtrl.h"
 
 #include <QDomDocument>
 

@@ -1,13 +1,13 @@
 // Block transfers started by the editor control: save the selection to a file, insert a file at the
 // caret, paste a block of another storage. They run on the transfer worker thread.
-#include "EditorCtrl.h"
+#include "hexeditor/EditorCtrl.h"
 
 #include <QLocale>
 
-#include "BulkTransfer.h"
 #include "ClientFramework/AppIdentity.h"
 #include "ClientFramework/DialogSeam.h"
 #include "ClientFramework/Log/ApplicationLog.h"
+#include "hexeditor/BulkTransfer.h"
 
 namespace HexEditor {
 

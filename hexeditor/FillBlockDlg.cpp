@@ -1,4 +1,4 @@
-#include "FillBlockDlg.h"
+#include "hexeditor/FillBlockDlg.h"
 
 #include <QDialogButtonBox>
 #include <QFormLayout>

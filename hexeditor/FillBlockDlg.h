@@ -5,7 +5,7 @@
 #include <QByteArray>
 #include <QDialog>
 
-#include "DiskArea.h"
+#include "hexeditor/DiskArea.h"
 
 class QLabel;
 class QLineEdit;

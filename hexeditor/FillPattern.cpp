@@ -1,4 +1,4 @@
-#include "FillPattern.h"
+#include "hexeditor/FillPattern.h"
 
 #include <cstring>
 

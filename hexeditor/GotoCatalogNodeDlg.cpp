@@ -1,4 +1,4 @@
-#include "GotoCatalogNodeDlg.h"
+#include "hexeditor/GotoCatalogNodeDlg.h"
 
 namespace HexEditor {
 

@@ -1,7 +1,7 @@
 // "Go to Catalog Node": a catalog node number of an HFS+ storage.
 #pragma once
 
-#include "GotoNumberDlg.h"
+#include "hexeditor/GotoNumberDlg.h"
 
 namespace HexEditor {
 

@@ -1,4 +1,4 @@
-#include "GotoMftDlg.h"
+#include "hexeditor/GotoMftDlg.h"
 
 namespace HexEditor {
 

@@ -1,7 +1,7 @@
 // "Go to MFT Record": an MFT record number of an NTFS storage.
 #pragma once
 
-#include "GotoNumberDlg.h"
+#include "hexeditor/GotoNumberDlg.h"
 
 namespace HexEditor {
 

@@ -1,6 +1,6 @@
-#include "GotoNumberDlg.h"
+#include "hexeditor/GotoNumberDlg.h"
 
-#include "HexInt64Validator.h"
+#include "hexeditor/HexInt64Validator.h"
 
 #include <QDialogButtonBox>
 #include <QGridLayout>

@@ -1,6 +1,6 @@
-#include "GotoOffsetDlg.h"
+#include "hexeditor/GotoOffsetDlg.h"
 
-#include "HexInt64Validator.h"
+#include "hexeditor/HexInt64Validator.h"
 
 #include <QButtonGroup>
 #include <QDialogButtonBox>

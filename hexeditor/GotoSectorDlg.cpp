@@ -1,6 +1,6 @@
-#include "GotoSectorDlg.h"
+#include "hexeditor/GotoSectorDlg.h"
 
-#include "HexInt64Validator.h"
+#include "hexeditor/HexInt64Validator.h"
 
 #include <QDialogButtonBox>
 #include <QGridLayout>

@@ -1,8 +1,8 @@
-#include "HexEditorSheet.h"
+#include "hexeditor/HexEditorSheet.h"
 
-#include "EditorCtrl.h"
-#include "Metrics.h"
-#include "View.h"
+#include "hexeditor/EditorCtrl.h"
+#include "hexeditor/Metrics.h"
+#include "hexeditor/View.h"
 
 #include "ClientFramework/AppIdentity.h"
 #include "ClientFramework/Settings/SettingsDocument.h"

@@ -1,4 +1,4 @@
-#include "HexInt64Validator.h"
+#include "hexeditor/HexInt64Validator.h"
 
 #include <QLocale>
 

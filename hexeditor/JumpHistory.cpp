@@ -1,4 +1,4 @@
-#include "JumpHistory.h"
+#include "hexeditor/JumpHistory.h"
 
 namespace HexEditor {
 

@@ -1,4 +1,4 @@
-#include "Layout.h"
+#include "hexeditor/Layout.h"
 
 #include <algorithm>
 

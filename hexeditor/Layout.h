@@ -7,8 +7,8 @@
 #include <QPolygon>
 #include <QString>
 
-#include "DiskArea.h"
-#include "Metrics.h"
+#include "hexeditor/DiskArea.h"
+#include "hexeditor/Metrics.h"
 
 namespace HexEditor::Layout {
 

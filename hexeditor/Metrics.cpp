@@ -1,4 +1,4 @@
-#include "Metrics.h"
+#include "hexeditor/Metrics.h"
 
 #include <QFontDatabase>
 #include <QFontInfo>

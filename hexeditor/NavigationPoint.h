@@ -8,7 +8,7 @@
 
 #include <cstdint>
 
-#include "templates/TemplateType.h"
+#include "hexeditor/templates/TemplateType.h"
 
 namespace HexEditor {
 

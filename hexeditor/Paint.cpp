@@ -1,4 +1,4 @@
-#include "Paint.h"
+#include "hexeditor/Paint.h"
 
 #include <QLinearGradient>
 #include <QPainter>
@@ -6,8 +6,8 @@
 #include <algorithm>
 #include <vector>
 
-#include "Layout.h"
-#include "Storage.h"
+#include "hexeditor/Layout.h"
+#include "hexeditor/Storage.h"
 
 namespace HexEditor {
 

@@ -11,10 +11,10 @@
 
 #include <functional>
 
-#include "DiskArea.h"
-#include "EditorCtrl.h"
-#include "Metrics.h"
-#include "PaintPalette.h"
+#include "hexeditor/DiskArea.h"
+#include "hexeditor/EditorCtrl.h"
+#include "hexeditor/Metrics.h"
+#include "hexeditor/PaintPalette.h"
 
 class QPainter;
 

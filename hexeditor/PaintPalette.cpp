@@ -1,4 +1,4 @@
-#include "PaintPalette.h"
+#include "hexeditor/PaintPalette.h"
 
 #include <QRegularExpression>
 

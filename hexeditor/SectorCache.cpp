@@ -1,4 +1,4 @@
-#include "SectorCache.h"
+#include "hexeditor/SectorCache.h"
 
 #include <algorithm>
 

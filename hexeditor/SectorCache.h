@@ -11,7 +11,7 @@
 #include <unordered_map>
 #include <vector>
 
-#include "Storage.h"
+#include "hexeditor/Storage.h"
 
 namespace HexEditor {
 

@@ -1,6 +1,6 @@
-#include "StatusCtrl.h"
+#include "hexeditor/StatusCtrl.h"
 
-#include "ViewResources.h"
+#include "hexeditor/ViewResources.h"
 
 #include <QHBoxLayout>
 #include <QIcon>

@@ -2,7 +2,7 @@
 // progress and stop button of a running search or transfer.
 #pragma once
 
-#include "DiskArea.h"
+#include "hexeditor/DiskArea.h"
 
 #include <QWidget>
 

@@ -1,11 +1,11 @@
-#include "Storage.h"
+#include "hexeditor/Storage.h"
 
 #include <algorithm>
 #include <cstring>
 
-#include "Kernel/Implementation/SystemError.h"
-#include "SectorCache.h"
-#include "StorageWriteGuard.h"
+#include "Kernel/Implementation/Common/SystemError.h"
+#include "hexeditor/SectorCache.h"
+#include "hexeditor/StorageWriteGuard.h"
 
 namespace HexEditor {
 

@@ -18,9 +18,9 @@
 #include <cstdint>
 #include <memory>
 
-#include "DiskArea.h"
-#include "Kernel/Implementation/cStorage.h"
-#include "NavigationPoint.h"
+#include "Kernel/Implementation/Common/cStorage.h"
+#include "hexeditor/DiskArea.h"
+#include "hexeditor/NavigationPoint.h"
 
 namespace HexEditor {
 

@@ -1,7 +1,7 @@
-#include "StorageDevice.h"
+#include "hexeditor/StorageDevice.h"
 
-#include "Kernel/Implementation/cDevice.h"
-#include "StorageNavigation.h"
+#include "Kernel/Implementation/Common/cDevice.h"
+#include "hexeditor/StorageNavigation.h"
 
 namespace HexEditor {
 

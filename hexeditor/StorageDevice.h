@@ -2,7 +2,7 @@
 // partition tables, the LDM database and one submenu per partition.
 #pragma once
 
-#include "Storage.h"
+#include "hexeditor/Storage.h"
 
 class cDevice;
 

@@ -1,14 +1,14 @@
-#include "StorageFactory.h"
+#include "hexeditor/StorageFactory.h"
 
+#include "Kernel/Implementation/Common/cDevice.h"
 #include "Kernel/Implementation/FS/Entry.h"
 #include "Kernel/Implementation/FS/Volume.h"
-#include "Kernel/Implementation/Partition.h"
-#include "Kernel/Implementation/cDevice.h"
-#include "StorageDevice.h"
-#include "StorageFile.h"
-#include "StoragePartition.h"
-#include "StoragePlainFile.h"
-#include "StorageVolume.h"
+#include "Kernel/Implementation/Partitions/Partition.h"
+#include "hexeditor/StorageDevice.h"
+#include "hexeditor/StorageFile.h"
+#include "hexeditor/StoragePartition.h"
+#include "hexeditor/StoragePlainFile.h"
+#include "hexeditor/StorageVolume.h"
 
 namespace HexEditor {
 

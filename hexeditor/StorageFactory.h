@@ -7,7 +7,7 @@
 
 #include <memory>
 
-#include "Storage.h"
+#include "hexeditor/Storage.h"
 
 class cRoot;
 class CVolume;

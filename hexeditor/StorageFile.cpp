@@ -1,9 +1,9 @@
-#include "StorageFile.h"
+#include "hexeditor/StorageFile.h"
 
+#include "Kernel/Implementation/Common/cDevice.h"
 #include "Kernel/Implementation/FS/Entry.h"
 #include "Kernel/Implementation/FS/Volume.h"
-#include "Kernel/Implementation/Partition.h"
-#include "Kernel/Implementation/cDevice.h"
+#include "Kernel/Implementation/Partitions/Partition.h"
 
 namespace HexEditor {
 

@@ -4,7 +4,7 @@
 
 #include <QMap>
 
-#include "StorageVolumeBase.h"
+#include "hexeditor/StorageVolumeBase.h"
 
 class cDevice;
 class cPartition;

@@ -1,4 +1,4 @@
-#include "StorageLayout.h"
+#include "hexeditor/StorageLayout.h"
 
 namespace HexEditor::Layout {
 

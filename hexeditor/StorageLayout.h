@@ -10,7 +10,7 @@
 #include <cstdint>
 #include <functional>
 
-#include "templates/TemplateType.h"
+#include "hexeditor/templates/TemplateType.h"
 
 namespace HexEditor::Layout {
 

@@ -1,11 +1,11 @@
-#include "StorageNavigation.h"
+#include "hexeditor/StorageNavigation.h"
 
 #include <QLocale>
 
-#include "Kernel/Implementation/DeviceInfo.h"
-#include "Kernel/Implementation/Partition.h"
-#include "Kernel/Implementation/cDevice.h"
-#include "StorageLayout.h"
+#include "Kernel/Implementation/Common/DeviceInfo.h"
+#include "Kernel/Implementation/Common/cDevice.h"
+#include "Kernel/Implementation/Partitions/Partition.h"
+#include "hexeditor/StorageLayout.h"
 
 namespace HexEditor::Navigation {
 

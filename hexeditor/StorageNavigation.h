@@ -5,7 +5,7 @@
 
 #include <cstdint>
 
-#include "NavigationPoint.h"
+#include "hexeditor/NavigationPoint.h"
 
 class cStorage;
 class cPartition;

@@ -1,11 +1,11 @@
-#include "StoragePartition.h"
+#include "hexeditor/StoragePartition.h"
 
 #include <functional>
 
 #include "Kernel/Implementation/FS/Volume.h"
-#include "Kernel/Implementation/Partition.h"
-#include "StorageNavigation.h"
-#include "StorageVolumeInfo.h"
+#include "Kernel/Implementation/Partitions/Partition.h"
+#include "hexeditor/StorageNavigation.h"
+#include "hexeditor/StorageVolumeInfo.h"
 
 namespace HexEditor {
 

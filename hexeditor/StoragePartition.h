@@ -2,7 +2,7 @@
 // answered by the partition's volume when there is one.
 #pragma once
 
-#include "Storage.h"
+#include "hexeditor/Storage.h"
 
 class cPartition;
 class CVolume;

@@ -1,12 +1,12 @@
-#include "StoragePlainFile.h"
+#include "hexeditor/StoragePlainFile.h"
 
 #include <QFileInfo>
 
 #include <algorithm>
 #include <cstring>
 
+#include "Kernel/Implementation/Common/SystemError.h"
 #include "Kernel/Implementation/Platform/PlatformFile.h"
-#include "Kernel/Implementation/SystemError.h"
 
 namespace HexEditor {
 

@@ -5,7 +5,7 @@
 
 #include <memory>
 
-#include "Storage.h"
+#include "hexeditor/Storage.h"
 
 class cRoot;
 

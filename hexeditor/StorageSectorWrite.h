@@ -11,8 +11,8 @@
 #include <cstdint>
 #include <cstring>
 
-#include "Kernel/Implementation/SystemError.h"
-#include "Kernel/Implementation/cStorage.h"
+#include "Kernel/Implementation/Common/SystemError.h"
+#include "Kernel/Implementation/Common/cStorage.h"
 
 namespace HexEditor::SectorWrite {
 

@@ -1,7 +1,7 @@
-#include "StorageVolume.h"
+#include "hexeditor/StorageVolume.h"
 
 #include "Kernel/Implementation/FS/Volume.h"
-#include "StorageNavigation.h"
+#include "hexeditor/StorageNavigation.h"
 
 namespace HexEditor {
 

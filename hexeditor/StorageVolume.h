@@ -2,7 +2,7 @@
 // file-system questions are the volume's, with the volume starting at byte 0.
 #pragma once
 
-#include "StorageVolumeBase.h"
+#include "hexeditor/StorageVolumeBase.h"
 
 namespace HexEditor {
 

@@ -1,7 +1,7 @@
-#include "StorageVolumeBase.h"
+#include "hexeditor/StorageVolumeBase.h"
 
 #include "Kernel/Implementation/FS/Volume.h"
-#include "StorageVolumeInfo.h"
+#include "hexeditor/StorageVolumeInfo.h"
 
 namespace HexEditor {
 

@@ -3,7 +3,7 @@
 // byte lies in the storage's own bytes.
 #pragma once
 
-#include "Storage.h"
+#include "hexeditor/Storage.h"
 
 class CVolume;
 

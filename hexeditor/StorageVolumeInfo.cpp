@@ -1,10 +1,10 @@
-#include "StorageVolumeInfo.h"
+#include "hexeditor/StorageVolumeInfo.h"
 
 #include <QByteArray>
 #include <QtEndian>
 
 #include "Kernel/Implementation/FS/Volume.h"
-#include "StorageLayout.h"
+#include "hexeditor/StorageLayout.h"
 
 namespace HexEditor::VolumeInfoQuery {
 

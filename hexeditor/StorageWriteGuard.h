@@ -13,13 +13,13 @@
 #include <memory>
 #include <vector>
 
-#include "Kernel/Implementation/Device.h"
+#include "Kernel/Implementation/Common/SystemError.h"
+#include "Kernel/Implementation/Devices/Device.h"
 #include "Kernel/Implementation/FS/Entry.h"
 #include "Kernel/Implementation/FS/Volume.h"
-#include "Kernel/Implementation/Partition.h"
+#include "Kernel/Implementation/Partitions/Partition.h"
 #include "Kernel/Implementation/Platform/PlatformFile.h"
-#include "Kernel/Implementation/Root.h"
-#include "Kernel/Implementation/SystemError.h"
+#include "Kernel/Implementation/Root/Root.h"
 
 namespace HexEditor {
 

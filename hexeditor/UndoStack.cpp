@@ -1,4 +1,4 @@
-#include "UndoStack.h"
+#include "hexeditor/UndoStack.h"
 
 #include <algorithm>
 

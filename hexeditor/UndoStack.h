@@ -9,8 +9,8 @@
 
 #include <cstdint>
 
-#include "DiskArea.h"
-#include "Storage.h"
+#include "hexeditor/DiskArea.h"
+#include "hexeditor/Storage.h"
 
 namespace HexEditor {
 

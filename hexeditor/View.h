@@ -4,7 +4,7 @@
 // closing with unsaved changes.
 #pragma once
 
-#include "JumpHistory.h"
+#include "hexeditor/JumpHistory.h"
 
 #include "ClientFramework/NodeTree/IPublisher.h"
 #include "ClientFramework/Views/GenericView.h"

@@ -1,6 +1,6 @@
-#include "ViewActions.h"
+#include "hexeditor/ViewActions.h"
 
-#include "ViewResources.h"
+#include "hexeditor/ViewResources.h"
 
 #include <QAction>
 #include <QCoreApplication>

@@ -1,4 +1,4 @@
-#include "ViewResources.h"
+#include "hexeditor/ViewResources.h"
 
 #include <QtGlobal>
 

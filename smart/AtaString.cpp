@@ -1,4 +1,4 @@
-#include "AtaString.h"
+#include "smart/AtaString.h"
 
 namespace Smart {
 

@@ -1,4 +1,4 @@
-#include "SmartText.h"
+#include "smart/SmartText.h"
 
 #include <QCoreApplication>
 

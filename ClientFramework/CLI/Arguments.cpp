@@ -1,9 +1,9 @@
-#include "Arguments.h"
+#include "ClientFramework/CLI/Arguments.h"
 
-#include "AppIdentity.h"
-#include "DialogSeam.h"
-#include "Settings/PathMacros.h"
-#include "Settings/SettingsDocument.h"
+#include "ClientFramework/AppIdentity.h"
+#include "ClientFramework/DialogSeam.h"
+#include "ClientFramework/Settings/PathMacros.h"
+#include "ClientFramework/Settings/SettingsDocument.h"
 
 #include <QCoreApplication>
 #include <QDir>

@@ -2,7 +2,7 @@
 // the first error, and the helpers that read option values.
 #pragma once
 
-#include "Settings/PersistenceXML.h"
+#include "ClientFramework/Settings/PersistenceXML.h"
 
 #include <QCommandLineParser>
 #include <QStringList>

@@ -1,6 +1,6 @@
-#include "Commander.h"
+#include "ClientFramework/Commands/Commander.h"
 
-#include "AppIdentity.h"
+#include "ClientFramework/AppIdentity.h"
 
 #include <QAction>
 #include <QCoreApplication>

@@ -3,7 +3,7 @@
 // the feature commanders that add their own commands.
 #pragma once
 
-#include "Commands/FeatureCommander.h"
+#include "ClientFramework/Commands/FeatureCommander.h"
 
 #include <QHash>
 #include <QList>

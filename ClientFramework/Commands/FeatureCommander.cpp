@@ -1,4 +1,4 @@
-#include "FeatureCommander.h"
+#include "ClientFramework/Commands/FeatureCommander.h"
 
 IFeatureCommander *FeatureCommanderList::find(const QString &featureId) const
 {

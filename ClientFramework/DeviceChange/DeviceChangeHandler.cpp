@@ -1,6 +1,6 @@
-#include "DeviceChangeHandler.h"
+#include "ClientFramework/DeviceChange/DeviceChangeHandler.h"
 
-#include "Log/ApplicationLog.h"
+#include "ClientFramework/Log/ApplicationLog.h"
 
 #include <utility>
 

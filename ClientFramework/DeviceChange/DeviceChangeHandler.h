@@ -6,8 +6,8 @@
 // notification that arrives while the mutex is held is dropped.
 #pragma once
 
-#include "DeviceChange/DeviceChangeSink.h"
-#include "DeviceChange/PostponedTimer.h"
+#include "ClientFramework/DeviceChange/DeviceChangeSink.h"
+#include "ClientFramework/DeviceChange/PostponedTimer.h"
 #include "Kernel/Implementation/Platform/Linux/UdevMonitor.h"
 
 #include <QList>

@@ -1,4 +1,4 @@
-#include "PostponedTimer.h"
+#include "ClientFramework/DeviceChange/PostponedTimer.h"
 
 #include <QTimer>
 

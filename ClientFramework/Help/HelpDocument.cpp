@@ -1,8 +1,8 @@
-#include "HelpDocument.h"
+#include "ClientFramework/Help/HelpDocument.h"
 
-#include "AppIdentity.h"
-#include "Commands/Commander.h"
-#include "DialogSeam.h"
+#include "ClientFramework/AppIdentity.h"
+#include "ClientFramework/Commands/Commander.h"
+#include "ClientFramework/DialogSeam.h"
 
 #include <QCoreApplication>
 #include <QFile>

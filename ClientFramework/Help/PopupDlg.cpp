@@ -1,4 +1,4 @@
-#include "PopupDlg.h"
+#include "ClientFramework/Help/PopupDlg.h"
 
 #include <QDialogButtonBox>
 #include <QLabel>

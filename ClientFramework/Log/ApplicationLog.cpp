@@ -1,9 +1,9 @@
-#include "ApplicationLog.h"
+#include "ClientFramework/Log/ApplicationLog.h"
 
-#include "AppIdentity.h"
-#include "Log/NameTags.h"
-#include "Settings/PathMacros.h"
-#include "Settings/SettingsDocument.h"
+#include "ClientFramework/AppIdentity.h"
+#include "ClientFramework/Log/NameTags.h"
+#include "ClientFramework/Settings/PathMacros.h"
+#include "ClientFramework/Settings/SettingsDocument.h"
 
 #include <QBrush>
 #include <QCoreApplication>

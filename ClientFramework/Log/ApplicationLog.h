@@ -2,8 +2,8 @@
 // written line by line to the log file.
 #pragma once
 
-#include "Log/LogEntry.h"
-#include "Settings/PersistenceXML.h"
+#include "ClientFramework/Log/LogEntry.h"
+#include "ClientFramework/Settings/PersistenceXML.h"
 
 #include <QAbstractItemModel>
 #include <QFile>

@@ -1,13 +1,13 @@
-#include "KernelLog.h"
+#include "ClientFramework/Log/KernelLog.h"
 
-#include "Application.h"
-#include "Log/ApplicationLog.h"
+#include "ClientFramework/Application.h"
+#include "ClientFramework/Log/ApplicationLog.h"
 
-#include "Kernel/Implementation/Device.h"
+#include "Kernel/Implementation/Common/SystemError.h"
+#include "Kernel/Implementation/Common/cRoot.h"
+#include "Kernel/Implementation/Devices/Device.h"
 #include "Kernel/Implementation/Platform/PlatformFile.h"
-#include "Kernel/Implementation/RootStatus.h"
-#include "Kernel/Implementation/SystemError.h"
-#include "Kernel/Implementation/cRoot.h"
+#include "Kernel/Implementation/Root/RootStatus.h"
 
 #include <QCoreApplication>
 #include <QPointer>

@@ -1,7 +1,7 @@
 // Turns the kernel root's records into log entries.
 #pragma once
 
-#include "Kernel/Implementation/KernelEvents.h"
+#include "Kernel/Implementation/Common/KernelEvents.h"
 
 #include <QString>
 

@@ -1,4 +1,4 @@
-#include "LogEntry.h"
+#include "ClientFramework/Log/LogEntry.h"
 
 #include <QCoreApplication>
 

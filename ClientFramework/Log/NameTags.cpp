@@ -1,7 +1,7 @@
-#include "NameTags.h"
+#include "ClientFramework/Log/NameTags.h"
 
-#include "AppIdentity.h"
-#include "Kernel/Implementation/KernelVersion.h"
+#include "ClientFramework/AppIdentity.h"
+#include "Kernel/Implementation/Common/KernelVersion.h"
 
 #include <QCoreApplication>
 #include <QDateTime>

@@ -1,7 +1,7 @@
-#include "DiskBrowserModel.h"
+#include "ClientFramework/NodeTree/DiskBrowserModel.h"
 
-#include "NodeCore.h"
-#include "Threads/NodeTagged.h"
+#include "ClientFramework/NodeTree/NodeCore.h"
+#include "ClientFramework/Threads/NodeTagged.h"
 
 #include <QCoreApplication>
 #include <QDeadlineTimer>

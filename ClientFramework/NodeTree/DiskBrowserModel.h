@@ -3,7 +3,7 @@
 // folder on the interface thread after the worker finished, and the rows appear then.
 #pragma once
 
-#include "NodeModel.h"
+#include "ClientFramework/NodeTree/NodeModel.h"
 
 #include <QList>
 #include <QSet>

@@ -1,11 +1,11 @@
-#include "EntryInfo.h"
+#include "ClientFramework/NodeTree/EntryInfo.h"
 
-#include "NodeAttr.h"
+#include "ClientFramework/NodeTree/NodeAttr.h"
 
-#include "Kernel/Implementation/Device.h"
+#include "Kernel/Implementation/Devices/Device.h"
 #include "Kernel/Implementation/FS/Entry.h"
 #include "Kernel/Implementation/FS/Volume.h"
-#include "Kernel/Implementation/Partition.h"
+#include "Kernel/Implementation/Partitions/Partition.h"
 
 #include <QCoreApplication>
 

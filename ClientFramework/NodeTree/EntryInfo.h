@@ -2,7 +2,7 @@
 // values of the file property groups.
 #pragma once
 
-#include "IProperty.h"
+#include "ClientFramework/NodeTree/IProperty.h"
 
 #include <QString>
 

@@ -1,6 +1,6 @@
-#include "NodeComputer.h"
+#include "ClientFramework/NodeTree/NodeComputer.h"
 
-#include "NodeMenu.h"
+#include "ClientFramework/NodeTree/NodeMenu.h"
 
 #include <QCoreApplication>
 #include <QSysInfo>

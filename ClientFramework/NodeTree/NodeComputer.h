@@ -1,7 +1,7 @@
 // The local computer ("My Computer").
 #pragma once
 
-#include "NodeCore.h"
+#include "ClientFramework/NodeTree/NodeCore.h"
 
 class NodeComputer : public NodeStatic
 {

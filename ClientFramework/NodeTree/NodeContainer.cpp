@@ -1,9 +1,9 @@
-#include "NodeContainer.h"
+#include "ClientFramework/NodeTree/NodeContainer.h"
 
-#include "EntryInfo.h"
-#include "NodeFile.h"
-#include "NodeFolder.h"
-#include "NodeMenu.h"
+#include "ClientFramework/NodeTree/EntryInfo.h"
+#include "ClientFramework/NodeTree/NodeFile.h"
+#include "ClientFramework/NodeTree/NodeFolder.h"
+#include "ClientFramework/NodeTree/NodeMenu.h"
 
 #include "Kernel/Implementation/FS/Entry.h"
 #include "Kernel/Implementation/FS/Volume.h"

@@ -2,9 +2,9 @@
 // container owns its file nodes; NodeFileContainer also answers for the entries it lists.
 #pragma once
 
-#include "IFileContainer.h"
-#include "IKernelStorage.h"
-#include "NodeCore.h"
+#include "ClientFramework/NodeTree/IFileContainer.h"
+#include "ClientFramework/NodeTree/IKernelStorage.h"
+#include "ClientFramework/NodeTree/NodeCore.h"
 
 #include <QList>
 

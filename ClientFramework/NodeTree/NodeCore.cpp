@@ -1,8 +1,8 @@
-#include "NodeCore.h"
+#include "ClientFramework/NodeTree/NodeCore.h"
 
-#include "NodeMenu.h"
-#include "Themes/Theme.h"
-#include "Threads/NodeTag.h"
+#include "ClientFramework/NodeTree/NodeMenu.h"
+#include "ClientFramework/Themes/Theme.h"
+#include "ClientFramework/Threads/NodeTag.h"
 
 #include <QCoreApplication>
 #include <QMenu>

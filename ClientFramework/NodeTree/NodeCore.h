@@ -4,10 +4,10 @@
 // populate()), which the interface thread hands over with applyPopulation().
 #pragma once
 
-#include "Attributes.h"
-#include "IProperty.h"
-#include "IPublisher.h"
-#include "NodeAttr.h"
+#include "ClientFramework/NodeTree/Attributes.h"
+#include "ClientFramework/NodeTree/IProperty.h"
+#include "ClientFramework/NodeTree/IPublisher.h"
+#include "ClientFramework/NodeTree/NodeAttr.h"
 
 #include <QColor>
 #include <QList>

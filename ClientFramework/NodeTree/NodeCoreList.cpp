@@ -1,6 +1,6 @@
-#include "NodeCoreList.h"
+#include "ClientFramework/NodeTree/NodeCoreList.h"
 
-#include "NodeMenu.h"
+#include "ClientFramework/NodeTree/NodeMenu.h"
 
 #include <QCoreApplication>
 

@@ -1,8 +1,8 @@
 // A multi-selection of nodes: the commands common to a selection and its summary text.
 #pragma once
 
-#include "IProperty.h"
-#include "NodeCore.h"
+#include "ClientFramework/NodeTree/IProperty.h"
+#include "ClientFramework/NodeTree/NodeCore.h"
 
 #include <QList>
 

@@ -1,11 +1,11 @@
-#include "NodeDevice.h"
+#include "ClientFramework/NodeTree/NodeDevice.h"
 
-#include "NodeDrive.h"
-#include "NodeMenu.h"
-#include "NodePartition.h"
-#include "VolumeSource.h"
+#include "ClientFramework/NodeTree/NodeDrive.h"
+#include "ClientFramework/NodeTree/NodeMenu.h"
+#include "ClientFramework/NodeTree/NodePartition.h"
+#include "ClientFramework/NodeTree/VolumeSource.h"
 
-#include "Kernel/Implementation/Device.h"
+#include "Kernel/Implementation/Devices/Device.h"
 #include "Kernel/Implementation/FS/Volume.h"
 
 #include <QCoreApplication>

@@ -3,7 +3,7 @@
 // whole device is one volume.
 #pragma once
 
-#include "NodeStorage.h"
+#include "ClientFramework/NodeTree/NodeStorage.h"
 
 #include <memory>
 

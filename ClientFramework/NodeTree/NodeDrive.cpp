@@ -1,12 +1,12 @@
-#include "NodeDrive.h"
+#include "ClientFramework/NodeTree/NodeDrive.h"
 
-#include "NodeFolder.h"
-#include "NodeMenu.h"
-#include "VolumeIntegrityGroup.h"
+#include "ClientFramework/NodeTree/NodeFolder.h"
+#include "ClientFramework/NodeTree/NodeMenu.h"
+#include "ClientFramework/NodeTree/VolumeIntegrityGroup.h"
 
-#include "Kernel/Implementation/Device.h"
+#include "Kernel/Implementation/Devices/Device.h"
 #include "Kernel/Implementation/FS/Volume.h"
-#include "Kernel/Implementation/Partition.h"
+#include "Kernel/Implementation/Partitions/Partition.h"
 
 #include <QAction>
 #include <QCoreApplication>

@@ -2,8 +2,8 @@
 // is populated on demand.
 #pragma once
 
-#include "IFileContainer.h"
-#include "NodeStorage.h"
+#include "ClientFramework/NodeTree/IFileContainer.h"
+#include "ClientFramework/NodeTree/NodeStorage.h"
 
 class CVolume;
 class NodeFolderRoot;

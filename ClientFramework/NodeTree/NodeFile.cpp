@@ -1,11 +1,11 @@
-#include "NodeFile.h"
+#include "ClientFramework/NodeTree/NodeFile.h"
 
-#include "EntryInfo.h"
-#include "NodeMenu.h"
+#include "ClientFramework/NodeTree/EntryInfo.h"
+#include "ClientFramework/NodeTree/NodeMenu.h"
 
 #include "Kernel/Implementation/FS/Entry.h"
 #include "Kernel/Implementation/FS/Volume.h"
-#include "Kernel/Implementation/Partition.h"
+#include "Kernel/Implementation/Partitions/Partition.h"
 
 #include <QCoreApplication>
 

@@ -1,9 +1,9 @@
 // A file of a volume.
 #pragma once
 
-#include "IKernelStorage.h"
-#include "IStorageGeometry.h"
-#include "NodeCore.h"
+#include "ClientFramework/NodeTree/IKernelStorage.h"
+#include "ClientFramework/NodeTree/IStorageGeometry.h"
+#include "ClientFramework/NodeTree/NodeCore.h"
 
 class NodeFile : public NodeCore, public IStorageGeometry, public IKernelStorage
 {

@@ -1,9 +1,9 @@
-#include "NodeFolder.h"
+#include "ClientFramework/NodeTree/NodeFolder.h"
 
-#include "EntryInfo.h"
-#include "NodeFile.h"
-#include "NodeMenu.h"
-#include "Threads/NodeTag.h"
+#include "ClientFramework/NodeTree/EntryInfo.h"
+#include "ClientFramework/NodeTree/NodeFile.h"
+#include "ClientFramework/NodeTree/NodeMenu.h"
+#include "ClientFramework/Threads/NodeTag.h"
 
 #include "Kernel/Implementation/FS/Entry.h"
 #include "Kernel/Implementation/FS/Volume.h"

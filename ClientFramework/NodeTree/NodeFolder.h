@@ -1,9 +1,9 @@
 // A folder of a volume, and the volume's root folder. Folders are populated on demand.
 #pragma once
 
-#include "IFileContainer.h"
-#include "IKernelStorage.h"
-#include "NodeCore.h"
+#include "ClientFramework/NodeTree/IFileContainer.h"
+#include "ClientFramework/NodeTree/IKernelStorage.h"
+#include "ClientFramework/NodeTree/NodeCore.h"
 
 #include <QList>
 

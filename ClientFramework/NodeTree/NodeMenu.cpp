@@ -1,7 +1,7 @@
-#include "NodeMenu.h"
+#include "ClientFramework/NodeTree/NodeMenu.h"
 
-#include "Commands/Commander.h"
-#include "NodeCore.h"
+#include "ClientFramework/Commands/Commander.h"
+#include "ClientFramework/NodeTree/NodeCore.h"
 
 #include <QAction>
 #include <QMenu>

@@ -1,6 +1,6 @@
-#include "NodeModel.h"
+#include "ClientFramework/NodeTree/NodeModel.h"
 
-#include "NodeCore.h"
+#include "ClientFramework/NodeTree/NodeCore.h"
 
 #include <QCoreApplication>
 

@@ -4,8 +4,8 @@
 // changed on the interface thread.
 #pragma once
 
-#include "IPublisher.h"
-#include "NodeAttr.h"
+#include "ClientFramework/NodeTree/IPublisher.h"
+#include "ClientFramework/NodeTree/NodeAttr.h"
 
 #include <QAbstractItemModel>
 #include <QList>

@@ -1,13 +1,13 @@
-#include "NodePartition.h"
+#include "ClientFramework/NodeTree/NodePartition.h"
 
-#include "NodeDrive.h"
-#include "NodeMenu.h"
-#include "VolumeIntegrityGroup.h"
-#include "VolumeSource.h"
+#include "ClientFramework/NodeTree/NodeDrive.h"
+#include "ClientFramework/NodeTree/NodeMenu.h"
+#include "ClientFramework/NodeTree/VolumeIntegrityGroup.h"
+#include "ClientFramework/NodeTree/VolumeSource.h"
 
-#include "Kernel/Implementation/Device.h"
+#include "Kernel/Implementation/Devices/Device.h"
 #include "Kernel/Implementation/FS/Volume.h"
-#include "Kernel/Implementation/Partition.h"
+#include "Kernel/Implementation/Partitions/Partition.h"
 
 #include <QCoreApplication>
 #include <QMenu>

@@ -2,7 +2,7 @@
 // children are its logical partitions; any other partition's child is its volume (NodeDrive).
 #pragma once
 
-#include "NodeStorage.h"
+#include "ClientFramework/NodeTree/NodeStorage.h"
 
 #include <memory>
 

@@ -1,11 +1,11 @@
-#include "NodeRoot.h"
+#include "ClientFramework/NodeTree/NodeRoot.h"
 
-#include "NodeComputer.h"
-#include "NodeDevice.h"
+#include "ClientFramework/NodeTree/NodeComputer.h"
+#include "ClientFramework/NodeTree/NodeDevice.h"
 
-#include "Kernel/Implementation/Device.h"
-#include "Kernel/Implementation/KernelEvents.h"
-#include "Kernel/Implementation/Root.h"
+#include "Kernel/Implementation/Common/KernelEvents.h"
+#include "Kernel/Implementation/Devices/Device.h"
+#include "Kernel/Implementation/Root/Root.h"
 
 #include <QCoreApplication>
 

@@ -4,7 +4,7 @@
 // arriving and leaving. The kernel's storage events reach it on the interface thread.
 #pragma once
 
-#include "NodeCore.h"
+#include "ClientFramework/NodeTree/NodeCore.h"
 
 #include <QObject>
 

@@ -1,7 +1,7 @@
-#include "NodeSortFilterModel.h"
+#include "ClientFramework/NodeTree/NodeSortFilterModel.h"
 
-#include "NodeCore.h"
-#include "NodeModel.h"
+#include "ClientFramework/NodeTree/NodeCore.h"
+#include "ClientFramework/NodeTree/NodeModel.h"
 
 #include <QCoreApplication>
 #include <QDomElement>

@@ -3,7 +3,7 @@
 // "bmfVirtDvc", "bmfPartitions", "bmfUnalloc", "bmfNetwork" and "bmfSysEntries".
 #pragma once
 
-#include "Settings/PersistenceXML.h"
+#include "ClientFramework/Settings/PersistenceXML.h"
 
 #include <QHash>
 #include <QSortFilterProxyModel>

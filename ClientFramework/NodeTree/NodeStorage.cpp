@@ -1,6 +1,6 @@
-#include "NodeStorage.h"
+#include "ClientFramework/NodeTree/NodeStorage.h"
 
-#include "Kernel/Implementation/cStorage.h"
+#include "Kernel/Implementation/Common/cStorage.h"
 
 uint32_t NodeStorage::sectorSize() const
 {

@@ -1,9 +1,9 @@
 // A node with sectors: a device, a partition or a volume.
 #pragma once
 
-#include "IKernelStorage.h"
-#include "IStorageGeometry.h"
-#include "NodeCore.h"
+#include "ClientFramework/NodeTree/IKernelStorage.h"
+#include "ClientFramework/NodeTree/IStorageGeometry.h"
+#include "ClientFramework/NodeTree/NodeCore.h"
 
 class NodeStorage : public NodeStatic, public IStorageGeometry, public IKernelStorage
 {

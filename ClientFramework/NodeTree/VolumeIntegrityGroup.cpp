@@ -1,4 +1,4 @@
-#include "VolumeIntegrityGroup.h"
+#include "ClientFramework/NodeTree/VolumeIntegrityGroup.h"
 
 #include "Kernel/Implementation/FS/Volume.h"
 #include "Kernel/Implementation/FS/VolumeIntegrity.h"

@@ -2,7 +2,7 @@
 // that holds the volume).
 #pragma once
 
-#include "IProperty.h"
+#include "ClientFramework/NodeTree/IProperty.h"
 
 class CVolume;
 

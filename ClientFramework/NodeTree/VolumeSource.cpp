@@ -1,9 +1,9 @@
-#include "VolumeSource.h"
+#include "ClientFramework/NodeTree/VolumeSource.h"
 
-#include "Kernel/Implementation/Device.h"
+#include "Kernel/Implementation/Devices/Device.h"
 #include "Kernel/Implementation/FS/Detect.h"
 #include "Kernel/Implementation/FS/Volume.h"
-#include "Kernel/Implementation/Partition.h"
+#include "Kernel/Implementation/Partitions/Partition.h"
 
 namespace VolumeSource {
 

@@ -1,9 +1,9 @@
-#include "LogSheet.h"
+#include "ClientFramework/Preferences/LogSheet.h"
 
-#include "AppIdentity.h"
-#include "Log/ApplicationLog.h"
-#include "Settings/PathMacros.h"
-#include "Settings/SettingsDocument.h"
+#include "ClientFramework/AppIdentity.h"
+#include "ClientFramework/Log/ApplicationLog.h"
+#include "ClientFramework/Settings/PathMacros.h"
+#include "ClientFramework/Settings/SettingsDocument.h"
 
 #include <QApplication>
 #include <QCheckBox>

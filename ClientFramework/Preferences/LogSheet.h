@@ -3,7 +3,7 @@
 // folder, name and the new-file switch apply from the next start.
 #pragma once
 
-#include "Preferences/PreferenceSheet.h"
+#include "ClientFramework/Preferences/PreferenceSheet.h"
 
 #include <cstdint>
 #include <functional>

@@ -1,4 +1,4 @@
-#include "PreferenceSheet.h"
+#include "ClientFramework/Preferences/PreferenceSheet.h"
 
 #include <QFormLayout>
 #include <QVBoxLayout>

@@ -3,7 +3,7 @@
 // of the settings document, found anew each time (the document may have been reloaded meanwhile).
 #pragma once
 
-#include "Preferences/IPreferencePage.h"
+#include "ClientFramework/Preferences/IPreferencePage.h"
 
 #include <QDomElement>
 #include <QWidget>

@@ -1,9 +1,9 @@
-#include "PreferencesCommand.h"
+#include "ClientFramework/Preferences/PreferencesCommand.h"
 
-#include "Commands/Commander.h"
-#include "Preferences/IPreferencePage.h"
-#include "Preferences/LogSheet.h"
-#include "Preferences/PreferencesDlg.h"
+#include "ClientFramework/Commands/Commander.h"
+#include "ClientFramework/Preferences/IPreferencePage.h"
+#include "ClientFramework/Preferences/LogSheet.h"
+#include "ClientFramework/Preferences/PreferencesDlg.h"
 
 #include <QPointer>
 

@@ -1,7 +1,7 @@
-#include "PreferencesDlg.h"
+#include "ClientFramework/Preferences/PreferencesDlg.h"
 
-#include "Log/ApplicationLog.h"
-#include "Settings/SettingsDocument.h"
+#include "ClientFramework/Log/ApplicationLog.h"
+#include "ClientFramework/Settings/SettingsDocument.h"
 
 #include <QDialogButtonBox>
 #include <QFrame>

@@ -4,7 +4,7 @@
 // nothing; "Restore Defaults" puts the defaults into the fields of the page shown.
 #pragma once
 
-#include "Preferences/IPreferencePage.h"
+#include "ClientFramework/Preferences/IPreferencePage.h"
 
 #include <QDialog>
 #include <QList>

@@ -1,7 +1,7 @@
-#include "ErrorHandling.h"
+#include "ClientFramework/Processing/ErrorHandling.h"
 
-#include "CLI/Arguments.h"
-#include "Settings/SettingsDocument.h"
+#include "ClientFramework/CLI/Arguments.h"
+#include "ClientFramework/Settings/SettingsDocument.h"
 
 #include <algorithm>
 

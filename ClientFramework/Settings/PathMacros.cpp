@@ -1,4 +1,4 @@
-#include "PathMacros.h"
+#include "ClientFramework/Settings/PathMacros.h"
 
 #include <QCoreApplication>
 #include <QDir>

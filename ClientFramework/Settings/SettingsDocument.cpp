@@ -1,7 +1,7 @@
-#include "SettingsDocument.h"
+#include "ClientFramework/Settings/SettingsDocument.h"
 
-#include "AppIdentity.h"
-#include "Log/ApplicationLog.h"
+#include "ClientFramework/AppIdentity.h"
+#include "ClientFramework/Log/ApplicationLog.h"
 
 #include <QDir>
 #include <QFile>

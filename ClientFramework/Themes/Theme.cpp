@@ -1,4 +1,4 @@
-#include "Theme.h"
+#include "ClientFramework/Themes/Theme.h"
 
 #include <QDomDocument>
 #include <QFile>

@@ -1,4 +1,4 @@
-#include "Generic.h"
+#include "ClientFramework/Threads/Generic.h"
 
 namespace Threads {
 

@@ -4,7 +4,7 @@
 // whose work() uses its own members stops and waits for the worker in its own destructor.
 #pragma once
 
-#include "Tag.h"
+#include "ClientFramework/Threads/Tag.h"
 
 #include <QThread>
 

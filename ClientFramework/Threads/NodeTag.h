@@ -2,7 +2,7 @@
 // too, whether an already populated node is rebuilt, and the depth of the recursion.
 #pragma once
 
-#include "Tag.h"
+#include "ClientFramework/Threads/Tag.h"
 
 class NodeCore;
 

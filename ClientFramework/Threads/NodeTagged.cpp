@@ -1,6 +1,6 @@
-#include "NodeTagged.h"
+#include "ClientFramework/Threads/NodeTagged.h"
 
-#include "NodeTree/NodeCore.h"
+#include "ClientFramework/NodeTree/NodeCore.h"
 
 namespace Threads {
 

@@ -3,7 +3,7 @@
 // populated() (queued), or call apply() after wait().
 #pragma once
 
-#include "NodeTag.h"
+#include "ClientFramework/Threads/NodeTag.h"
 
 #include <QThread>
 

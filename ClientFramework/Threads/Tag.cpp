@@ -1,4 +1,4 @@
-#include "Tag.h"
+#include "ClientFramework/Threads/Tag.h"
 
 #include <QMutexLocker>
 

@@ -1,8 +1,8 @@
-#include "DeviceMap.h"
+#include "ClientFramework/Views/DeviceMap.h"
 
-#include "NodeTree/IStorageGeometry.h"
-#include "NodeTree/NodeCore.h"
-#include "NodeTree/NodePartition.h"
+#include "ClientFramework/NodeTree/IStorageGeometry.h"
+#include "ClientFramework/NodeTree/NodeCore.h"
+#include "ClientFramework/NodeTree/NodePartition.h"
 
 #include <QAbstractItemModel>
 #include <QMouseEvent>

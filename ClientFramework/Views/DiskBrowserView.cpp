@@ -1,9 +1,9 @@
-#include "DiskBrowserView.h"
+#include "ClientFramework/Views/DiskBrowserView.h"
 
-#include "NodeTree/DiskBrowserModel.h"
-#include "NodeTree/NodeDrive.h"
-#include "NodeTree/NodeFolder.h"
-#include "NodeTree/NodeSortFilterModel.h"
+#include "ClientFramework/NodeTree/DiskBrowserModel.h"
+#include "ClientFramework/NodeTree/NodeDrive.h"
+#include "ClientFramework/NodeTree/NodeFolder.h"
+#include "ClientFramework/NodeTree/NodeSortFilterModel.h"
 
 #include <QAction>
 #include <QDomElement>

@@ -5,7 +5,7 @@
 // from the nodes through the command registry.
 #pragma once
 
-#include "Views/NodeView.h"
+#include "ClientFramework/Views/NodeView.h"
 
 class QLabel;
 class QSortFilterProxyModel;

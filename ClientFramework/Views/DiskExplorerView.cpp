@@ -1,8 +1,8 @@
-#include "DiskExplorerView.h"
+#include "ClientFramework/Views/DiskExplorerView.h"
 
-#include "NodeTree/DiskBrowserModel.h"
-#include "NodeTree/NodeSortFilterModel.h"
-#include "Views/DeviceMap.h"
+#include "ClientFramework/NodeTree/DiskBrowserModel.h"
+#include "ClientFramework/NodeTree/NodeSortFilterModel.h"
+#include "ClientFramework/Views/DeviceMap.h"
 
 #include <QHeaderView>
 #include <QLabel>

@@ -3,7 +3,7 @@
 // commands through the command registry; folders populate on expansion on a worker thread.
 #pragma once
 
-#include "Views/NodeView.h"
+#include "ClientFramework/Views/NodeView.h"
 
 class QLabel;
 class QTreeView;

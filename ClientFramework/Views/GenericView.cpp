@@ -1,4 +1,4 @@
-#include "GenericView.h"
+#include "ClientFramework/Views/GenericView.h"
 
 namespace Framework {
 

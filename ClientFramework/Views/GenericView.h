@@ -2,9 +2,9 @@
 // view id and a title, its own menu actions and its own settings element below "views".
 #pragma once
 
-#include "Settings/PersistenceXML.h"
-#include "Views/INodeSource.h"
-#include "Views/IWidgetActions.h"
+#include "ClientFramework/Settings/PersistenceXML.h"
+#include "ClientFramework/Views/INodeSource.h"
+#include "ClientFramework/Views/IWidgetActions.h"
 
 #include <QList>
 #include <QMainWindow>

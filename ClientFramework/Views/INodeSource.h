@@ -4,7 +4,7 @@
 
 #include <QList>
 
-#include "NodeTree/NodeCore.h"
+#include "ClientFramework/NodeTree/NodeCore.h"
 
 class INodeSource
 {

@@ -1,6 +1,6 @@
-#include "LogView.h"
+#include "ClientFramework/Views/LogView.h"
 
-#include "Log/ApplicationLog.h"
+#include "ClientFramework/Log/ApplicationLog.h"
 
 #include <QHeaderView>
 #include <QTreeView>

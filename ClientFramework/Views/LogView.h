@@ -2,7 +2,7 @@
 // "Event" and "Message", following the newest entry.
 #pragma once
 
-#include "Views/GenericView.h"
+#include "ClientFramework/Views/GenericView.h"
 
 class QTreeView;
 

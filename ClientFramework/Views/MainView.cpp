@@ -1,15 +1,15 @@
-#include "MainView.h"
+#include "ClientFramework/Views/MainView.h"
 
-#include "AppIdentity.h"
-#include "Commands/Commander.h"
-#include "DialogSeam.h"
-#include "Help/HelpDocument.h"
-#include "Preferences/PreferencesCommand.h"
-#include "Settings/SettingsDocument.h"
-#include "Views/GenericView.h"
-#include "Views/LogView.h"
-#include "Views/RecentFiles.h"
-#include "Views/WindowManager.h"
+#include "ClientFramework/AppIdentity.h"
+#include "ClientFramework/Commands/Commander.h"
+#include "ClientFramework/DialogSeam.h"
+#include "ClientFramework/Help/HelpDocument.h"
+#include "ClientFramework/Preferences/PreferencesCommand.h"
+#include "ClientFramework/Settings/SettingsDocument.h"
+#include "ClientFramework/Views/GenericView.h"
+#include "ClientFramework/Views/LogView.h"
+#include "ClientFramework/Views/RecentFiles.h"
+#include "ClientFramework/Views/WindowManager.h"
 
 #include <QAction>
 #include <QApplication>

@@ -3,7 +3,7 @@
 // the status bar, and the window state in the settings.
 #pragma once
 
-#include "Settings/PersistenceXML.h"
+#include "ClientFramework/Settings/PersistenceXML.h"
 
 #include <QMainWindow>
 #include <QStringList>

@@ -1,9 +1,9 @@
-#include "NodeView.h"
+#include "ClientFramework/Views/NodeView.h"
 
-#include "Commands/Commander.h"
-#include "NodeTree/DiskBrowserModel.h"
-#include "NodeTree/NodeCoreList.h"
-#include "NodeTree/NodeSortFilterModel.h"
+#include "ClientFramework/Commands/Commander.h"
+#include "ClientFramework/NodeTree/DiskBrowserModel.h"
+#include "ClientFramework/NodeTree/NodeCoreList.h"
+#include "ClientFramework/NodeTree/NodeSortFilterModel.h"
 
 #include <QAction>
 #include <QItemSelectionModel>

@@ -5,9 +5,9 @@
 // are kept in the view's settings element.
 #pragma once
 
-#include "NodeTree/NodeAttr.h"
-#include "Views/GenericView.h"
-#include "Views/INodeSource.h"
+#include "ClientFramework/NodeTree/NodeAttr.h"
+#include "ClientFramework/Views/GenericView.h"
+#include "ClientFramework/Views/INodeSource.h"
 
 #include <QList>
 #include <QModelIndex>

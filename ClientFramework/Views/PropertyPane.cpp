@@ -1,6 +1,6 @@
-#include "PropertyPane.h"
+#include "ClientFramework/Views/PropertyPane.h"
 
-#include "NodeTree/NodeCoreList.h"
+#include "ClientFramework/NodeTree/NodeCoreList.h"
 
 #include <QHeaderView>
 #include <QTreeWidget>

@@ -1,7 +1,7 @@
 // The property pane ("properties"): the property groups of the selection of the active node view.
 #pragma once
 
-#include "Views/GenericView.h"
+#include "ClientFramework/Views/GenericView.h"
 
 class QTreeWidget;
 

@@ -1,6 +1,6 @@
-#include "RecentFiles.h"
+#include "ClientFramework/Views/RecentFiles.h"
 
-#include "Settings/SettingsDocument.h"
+#include "ClientFramework/Settings/SettingsDocument.h"
 
 #include <QDir>
 

@@ -1,7 +1,7 @@
 // The recently used disk-image files, newest first, kept in the settings element "recent-files".
 #pragma once
 
-#include "Settings/PersistenceXML.h"
+#include "ClientFramework/Settings/PersistenceXML.h"
 
 #include <QObject>
 #include <QStringList>

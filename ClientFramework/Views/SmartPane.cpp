@@ -1,6 +1,6 @@
-#include "SmartPane.h"
+#include "ClientFramework/Views/SmartPane.h"
 
-#include "NodeTree/NodeCore.h"
+#include "ClientFramework/NodeTree/NodeCore.h"
 
 #include "smart/SmartText.h"
 

@@ -2,9 +2,9 @@
 // selected in the active node view, read through a provider; "Refresh" reads them again.
 #pragma once
 
-#include "NodeTree/IPublisher.h"
-#include "Views/GenericView.h"
-#include "Views/SmartProvider.h"
+#include "ClientFramework/NodeTree/IPublisher.h"
+#include "ClientFramework/Views/GenericView.h"
+#include "ClientFramework/Views/SmartProvider.h"
 
 #include <memory>
 

@@ -1,4 +1,4 @@
-#include "UserPrompts.h"
+#include "ClientFramework/Views/UserPrompts.h"
 
 #include <QDesktopServices>
 #include <QFileDialog>

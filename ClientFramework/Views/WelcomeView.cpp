@@ -1,9 +1,9 @@
-#include "WelcomeView.h"
+#include "ClientFramework/Views/WelcomeView.h"
 
-#include "AppIdentity.h"
-#include "Commands/Commander.h"
-#include "Privileges.h"
-#include "Settings/SettingsDocument.h"
+#include "ClientFramework/AppIdentity.h"
+#include "ClientFramework/Commands/Commander.h"
+#include "ClientFramework/Privileges.h"
+#include "ClientFramework/Settings/SettingsDocument.h"
 
 #include <QAction>
 #include <QCheckBox>

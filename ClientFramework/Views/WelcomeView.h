@@ -2,7 +2,7 @@
 // ("Administrator Rights"), and the "Show this view on startup" box kept in its settings element.
 #pragma once
 
-#include "Views/GenericView.h"
+#include "ClientFramework/Views/GenericView.h"
 
 #include <QStringList>
 

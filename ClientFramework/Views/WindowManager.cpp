@@ -1,8 +1,8 @@
-#include "WindowManager.h"
+#include "ClientFramework/Views/WindowManager.h"
 
-#include "Log/ApplicationLog.h"
-#include "Views/GenericView.h"
-#include "Views/INodeSource.h"
+#include "ClientFramework/Log/ApplicationLog.h"
+#include "ClientFramework/Views/GenericView.h"
+#include "ClientFramework/Views/INodeSource.h"
 
 #include <QDockWidget>
 #include <QMainWindow>

@@ -3,7 +3,7 @@
 // the active view.
 #pragma once
 
-#include "Views/INodeSource.h"
+#include "ClientFramework/Views/INodeSource.h"
 
 #include <QHash>
 #include <QList>

@@ -1,11 +1,11 @@
-#include "Delegate.h"
+#include "hexeditor/templates/Delegate.h"
 
 #include <QLineEdit>
 #include <QRegularExpressionValidator>
 
-#include "Model.h"
-#include "Validators.h"
-#include "core/Values.h"
+#include "hexeditor/templates/Model.h"
+#include "hexeditor/templates/Validators.h"
+#include "hexeditor/templates/core/Values.h"
 
 namespace HexEditor::Templates {
 

@@ -1,8 +1,8 @@
 // The GUID partition table template: the header sector and the 128-entry array.
 #pragma once
 
-#include "Model.h"
-#include "core/GptBuilder.h"
+#include "hexeditor/templates/Model.h"
+#include "hexeditor/templates/core/GptBuilder.h"
 
 namespace HexEditor::Templates {
 

@@ -1,8 +1,8 @@
 // The templates of the Logical Disk Manager database records.
 #pragma once
 
-#include "Model.h"
-#include "core/LdmBuilders.h"
+#include "hexeditor/templates/Model.h"
+#include "hexeditor/templates/core/LdmBuilders.h"
 
 namespace HexEditor::Templates {
 

@@ -1,8 +1,8 @@
 // The Master Boot Record template.
 #pragma once
 
-#include "Model.h"
-#include "core/MbrBuilder.h"
+#include "hexeditor/templates/Model.h"
+#include "hexeditor/templates/core/MbrBuilder.h"
 
 namespace HexEditor::Templates {
 

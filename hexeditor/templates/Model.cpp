@@ -1,13 +1,13 @@
-#include "Model.h"
+#include "hexeditor/templates/Model.h"
 
 #include <QFont>
 
-#include "GptModel.h"
-#include "LdmModels.h"
-#include "MbrModel.h"
-#include "StorageSource.h"
-#include "core/Catalog.h"
-#include "core/Values.h"
+#include "hexeditor/templates/GptModel.h"
+#include "hexeditor/templates/LdmModels.h"
+#include "hexeditor/templates/MbrModel.h"
+#include "hexeditor/templates/StorageSource.h"
+#include "hexeditor/templates/core/Catalog.h"
+#include "hexeditor/templates/core/Values.h"
 
 namespace HexEditor::Templates {
 

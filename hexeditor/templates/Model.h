@@ -10,9 +10,9 @@
 
 #include <memory>
 
-#include "core/Record.h"
 #include "hexeditor/DiskArea.h"
 #include "hexeditor/Storage.h" // declares the DiskArea meta type the slots use
+#include "hexeditor/templates/core/Record.h"
 
 namespace HexEditor {
 class Storage;

@@ -1,7 +1,7 @@
-#include "OffsetEditCtrl.h"
+#include "hexeditor/templates/OffsetEditCtrl.h"
 
-#include "core/SizeMath.h"
-#include "core/Values.h"
+#include "hexeditor/templates/core/SizeMath.h"
+#include "hexeditor/templates/core/Values.h"
 
 #include <QLocale>
 

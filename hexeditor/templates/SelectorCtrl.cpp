@@ -1,11 +1,11 @@
-#include "SelectorCtrl.h"
+#include "hexeditor/templates/SelectorCtrl.h"
 
 #include <QHeaderView>
 #include <QStandardItemModel>
 #include <QTreeView>
 
-#include "Model.h"
-#include "core/Catalog.h"
+#include "hexeditor/templates/Model.h"
+#include "hexeditor/templates/core/Catalog.h"
 
 namespace HexEditor::Templates {
 

@@ -9,7 +9,7 @@
 #include <memory>
 #include <vector>
 
-#include "core/TemplateType.h"
+#include "hexeditor/templates/core/TemplateType.h"
 
 class QStandardItemModel;
 class QTreeView;

@@ -1,4 +1,4 @@
-#include "StorageSource.h"
+#include "hexeditor/templates/StorageSource.h"
 
 #include "hexeditor/Storage.h"
 

@@ -2,7 +2,7 @@
 // template shows the bytes as edited.
 #pragma once
 
-#include "core/Source.h"
+#include "hexeditor/templates/core/Source.h"
 
 namespace HexEditor {
 class Storage;

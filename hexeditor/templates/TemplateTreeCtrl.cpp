@@ -1,9 +1,9 @@
-#include "TemplateTreeCtrl.h"
+#include "hexeditor/templates/TemplateTreeCtrl.h"
 
 #include <QMouseEvent>
 
-#include "Delegate.h"
-#include "Model.h"
+#include "hexeditor/templates/Delegate.h"
+#include "hexeditor/templates/Model.h"
 
 namespace HexEditor::Templates {
 

@@ -4,7 +4,7 @@
 
 #include <QTreeView>
 
-#include "core/FieldFormat.h"
+#include "hexeditor/templates/core/FieldFormat.h"
 
 namespace HexEditor::Templates {
 

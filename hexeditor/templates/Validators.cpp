@@ -1,8 +1,8 @@
-#include "Validators.h"
+#include "hexeditor/templates/Validators.h"
 
 #include <QLocale>
 
-#include "core/Values.h"
+#include "hexeditor/templates/core/Values.h"
 
 namespace HexEditor::Templates {
 

@@ -1,4 +1,4 @@
-#include "View.h"
+#include "hexeditor/templates/View.h"
 
 #include <QAction>
 #include <QApplication>
@@ -12,14 +12,14 @@
 #include <functional>
 
 #include "ClientFramework/Settings/SettingsDocument.h"
-#include "Kernel/Implementation/cDevice.h"
-#include "Model.h"
-#include "OffsetEditCtrl.h"
-#include "TemplateTreeCtrl.h"
-#include "core/Catalog.h"
-#include "core/TreeText.h"
+#include "Kernel/Implementation/Common/cDevice.h"
 #include "hexeditor/EditorCtrl.h"
 #include "hexeditor/Storage.h"
+#include "hexeditor/templates/Model.h"
+#include "hexeditor/templates/OffsetEditCtrl.h"
+#include "hexeditor/templates/TemplateTreeCtrl.h"
+#include "hexeditor/templates/core/Catalog.h"
+#include "hexeditor/templates/core/TreeText.h"
 
 // The pane's own icons live in a static library: register them before first use.
 static void initTemplateResources()

@@ -12,11 +12,11 @@
 #include <cstdint>
 
 #include "ClientFramework/Settings/PersistenceXML.h"
-#include "SelectorCtrl.h"
-#include "core/FieldFormat.h"
 #include "hexeditor/DiskArea.h"
-#include "hexeditor/Storage.h" // declares the DiskArea meta type the slots use
 #include "hexeditor/Metrics.h"
+#include "hexeditor/Storage.h" // declares the DiskArea meta type the slots use
+#include "hexeditor/templates/SelectorCtrl.h"
+#include "hexeditor/templates/core/FieldFormat.h"
 
 class QAction;
 class QToolBar;

@@ -1,7 +1,7 @@
 // The built program on the offscreen platform starts, writes the per-user settings and log files, and
 // ends in order when asked to terminate.
-#include "ScratchHome.h"
-#include "TestUtil.h"
+#include "tests/common/ScratchHome.h"
+#include "tests/common/TestUtil.h"
 
 #include <QProcess>
 #include <QProcessEnvironment>

@@ -1,5 +1,5 @@
 // The product's command line: what the options that name a target read as, and the help page.
-#include "CliArguments.h"
+#include "app/CliArguments.h"
 
 #include <QRegularExpression>
 #include <gtest/gtest.h>

@@ -3,15 +3,15 @@
 // read afterwards); identified again with the same medium it keeps its device, its nodes and its
 // views; a partition table written meanwhile replaces the partitions in place, closing only the
 // views over the partitions that went.
-#include "LogTestUtil.h"
-#include "RecordingDialogs.h"
-#include "TestUtil.h"
+#include "tests/common/LogTestUtil.h"
+#include "tests/common/RecordingDialogs.h"
+#include "tests/common/TestUtil.h"
 
 #include "ClientFramework/NodeTree/NodeDevice.h"
 #include "ClientFramework/NodeTree/NodePartition.h"
 #include "ClientFramework/NodeTree/NodeRoot.h"
-#include "Kernel/Implementation/Device.h"
-#include "Kernel/Implementation/Root.h"
+#include "Kernel/Implementation/Devices/Device.h"
+#include "Kernel/Implementation/Root/Root.h"
 #include "hexeditor/Commander.h"
 #include "hexeditor/EditorCtrl.h"
 #include "hexeditor/Storage.h"

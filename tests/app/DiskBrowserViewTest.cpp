@@ -19,14 +19,14 @@
 #include "ClientFramework/Views/DiskExplorerView.h"
 #include "ClientFramework/Views/PropertyPane.h"
 #include "ClientFramework/Views/WindowManager.h"
-#include "Kernel/Implementation/Root.h"
+#include "Kernel/Implementation/Root/Root.h"
 
-#include "LogTestUtil.h"
-#include "MemoryVolume.h"
-#include "RecordingDialogs.h"
-#include "ScratchHome.h"
-#include "TestMainWindow.h"
-#include "TestUtil.h"
+#include "tests/app/TestMainWindow.h"
+#include "tests/common/LogTestUtil.h"
+#include "tests/common/MemoryVolume.h"
+#include "tests/common/RecordingDialogs.h"
+#include "tests/common/ScratchHome.h"
+#include "tests/common/TestUtil.h"
 
 #include <QAbstractItemModelTester>
 #include <QAction>

@@ -1,7 +1,7 @@
 // "Help" and "Help Contents": the built-in guide, its contents page and the commands that show them
 // through the dialog seam, in a main window.
-#include "RecordingDialogs.h"
-#include "ScratchHome.h"
+#include "tests/common/RecordingDialogs.h"
+#include "tests/common/ScratchHome.h"
 
 #include "ClientFramework/AppIdentity.h"
 #include "ClientFramework/Commands/Commander.h"

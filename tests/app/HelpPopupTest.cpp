@@ -1,5 +1,5 @@
 // The help pop-up dialog shows the filled-in page and its footer.
-#include "CliArguments.h"
+#include "app/CliArguments.h"
 
 #include "ClientFramework/Help/PopupDlg.h"
 

@@ -1,16 +1,16 @@
 // The command line's requests carried out over the kernel, the node tree and the hex editor: a
 // mounted image found by its number or path, a volume by its start offset, a plain file, each
 // opened in a view with the caret at the offset and the template requested where asked.
-#include "CliArguments.h"
-#include "KernelHost.h"
-#include "ProcessingAction.h"
-#include "RecordingDialogs.h"
-#include "TestUtil.h"
+#include "app/CliArguments.h"
+#include "app/KernelHost.h"
+#include "app/ProcessingAction.h"
+#include "tests/common/RecordingDialogs.h"
+#include "tests/common/TestUtil.h"
 
 #include "ClientFramework/NodeTree/NodeDevice.h"
 #include "ClientFramework/NodeTree/NodeRoot.h"
-#include "Kernel/Implementation/Device.h"
-#include "Kernel/Implementation/Root.h"
+#include "Kernel/Implementation/Devices/Device.h"
+#include "Kernel/Implementation/Root/Root.h"
 #include "hexeditor/Commander.h"
 #include "hexeditor/EditorCtrl.h"
 #include "hexeditor/Storage.h"

@@ -1,7 +1,7 @@
 // The program's kernel requests from the command line: "-test" writes the hardware report and quits,
 // "-mountdi" opens an image as a virtual disk during start-up (and refuses a file that is no image).
-#include "ScratchHome.h"
-#include "TestUtil.h"
+#include "tests/common/ScratchHome.h"
+#include "tests/common/TestUtil.h"
 
 #include <QProcess>
 #include <QProcessEnvironment>

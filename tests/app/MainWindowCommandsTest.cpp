@@ -19,18 +19,18 @@
 #include "ClientFramework/Views/SmartPane.h"
 #include "ClientFramework/Views/UserPrompts.h"
 #include "ClientFramework/Views/WindowManager.h"
-#include "Kernel/Implementation/Root.h"
+#include "Kernel/Implementation/Root/Root.h"
 
 #include "ClientFramework/Log/ApplicationLog.h"
 #include "ClientFramework/NodeTree/NodeDevice.h"
-#include "Kernel/Implementation/Device.h"
+#include "Kernel/Implementation/Devices/Device.h"
 
-#include "MemoryVolume.h"
-#include "RecordingDialogs.h"
-#include "RootTestSupport.h"
-#include "ScratchHome.h"
-#include "TestMainWindow.h"
-#include "TestUtil.h"
+#include "tests/app/TestMainWindow.h"
+#include "tests/common/MemoryVolume.h"
+#include "tests/common/RecordingDialogs.h"
+#include "tests/common/RootTestSupport.h"
+#include "tests/common/ScratchHome.h"
+#include "tests/common/TestUtil.h"
 
 #include <QAction>
 #include <QApplication>

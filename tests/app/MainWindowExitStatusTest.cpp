@@ -5,11 +5,11 @@
 
 #include "ClientFramework/Application.h"
 #include "ClientFramework/Log/ApplicationLog.h"
+#include "Kernel/Implementation/Common/SystemError.h"
 #include "Kernel/Implementation/Platform/PlatformFile.h"
-#include "Kernel/Implementation/Root.h"
-#include "Kernel/Implementation/SystemError.h"
+#include "Kernel/Implementation/Root/Root.h"
 
-#include "ScratchHome.h"
+#include "tests/common/ScratchHome.h"
 
 #include <QApplication>
 #include <QSignalSpy>

@@ -10,13 +10,13 @@
 #include "ClientFramework/Views/DiskExplorerView.h"
 #include "ClientFramework/Views/UserPrompts.h"
 #include "ClientFramework/Views/WindowManager.h"
-#include "Kernel/Implementation/Device.h"
+#include "Kernel/Implementation/Devices/Device.h"
 #include "Kernel/Implementation/Platform/PlatformFile.h"
-#include "Kernel/Implementation/Root.h"
+#include "Kernel/Implementation/Root/Root.h"
 
-#include "RecordingDialogs.h"
-#include "ScratchHome.h"
-#include "TestUtil.h"
+#include "tests/common/RecordingDialogs.h"
+#include "tests/common/ScratchHome.h"
+#include "tests/common/TestUtil.h"
 
 #include <QAction>
 #include <QDir>

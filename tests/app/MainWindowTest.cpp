@@ -17,8 +17,8 @@
 #include "ClientFramework/Views/WelcomeView.h"
 #include "ClientFramework/Views/WindowManager.h"
 
-#include "TestMainWindow.h"
-#include "TestUtil.h"
+#include "tests/app/TestMainWindow.h"
+#include "tests/common/TestUtil.h"
 
 #include <QAbstractItemModelTester>
 #include <QAction>

@@ -1,9 +1,9 @@
 // The command-line action: device numbering, the context it opens and what it reports.
-#include "ProcessingAction.h"
-#include "CliArguments.h"
-#include "LogTestUtil.h"
-#include "RecordingDialogs.h"
-#include "RequestHost.h"
+#include "app/ProcessingAction.h"
+#include "app/CliArguments.h"
+#include "app/RequestHost.h"
+#include "tests/common/LogTestUtil.h"
+#include "tests/common/RecordingDialogs.h"
 
 #include <QtTest/QSignalSpy>
 #include <gtest/gtest.h>

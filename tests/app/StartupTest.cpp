@@ -1,14 +1,14 @@
 // Start-up driven headless: boxes through the dialog seam, exit codes, the settings and log files.
-#include "Startup.h"
-#include "LogTestUtil.h"
-#include "RecordingDialogs.h"
-#include "ScratchHome.h"
-#include "TestUtil.h"
+#include "app/Startup.h"
+#include "tests/common/LogTestUtil.h"
+#include "tests/common/RecordingDialogs.h"
+#include "tests/common/ScratchHome.h"
+#include "tests/common/TestUtil.h"
 
 #include "ClientFramework/Application.h"
 #include "ClientFramework/SingleInstanceGuard.h"
-#include "Kernel/Implementation/KernelVersion.h"
-#include "Kernel/Implementation/Root.h"
+#include "Kernel/Implementation/Common/KernelVersion.h"
+#include "Kernel/Implementation/Root/Root.h"
 
 #include <QApplication>
 #include <QDir>

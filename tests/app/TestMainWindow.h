@@ -12,11 +12,11 @@
 #include "ClientFramework/Views/UserPrompts.h"
 #include "ClientFramework/Views/WindowManager.h"
 #include "Kernel/Implementation/FS/Volume.h"
-#include "Kernel/Implementation/Images/ImageOpen.h"
-#include "Kernel/Implementation/Root.h"
+#include "Kernel/Implementation/Root/ImageOpen.h"
+#include "Kernel/Implementation/Root/Root.h"
 
-#include "RecordingDialogs.h"
-#include "ScratchHome.h"
+#include "tests/common/RecordingDialogs.h"
+#include "tests/common/ScratchHome.h"
 
 #include <QAction>
 #include <QDomElement>

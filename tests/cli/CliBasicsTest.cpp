@@ -4,8 +4,8 @@
 #include <QBuffer>
 #include <QTextStream>
 
-#include "TestUtil.h"
 #include "cli/CliCommand.h"
+#include "tests/common/TestUtil.h"
 
 namespace {
 

@@ -2,12 +2,12 @@
 // blockdev; and the listing of a device the user has no rights to.
 #include <gtest/gtest.h>
 
-#include "Kernel/Implementation/Device.h"
+#include "Kernel/Implementation/Devices/Device.h"
 #include "Kernel/Implementation/Platform/PlatformFile.h"
-#include "Kernel/Implementation/Root.h"
-#include "TestUtil.h"
+#include "Kernel/Implementation/Root/Root.h"
 #include "cli/Devices.h"
 #include "cli/Source.h"
+#include "tests/common/TestUtil.h"
 
 #include <QJsonArray>
 #include <QJsonDocument>

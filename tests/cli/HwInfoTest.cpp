@@ -9,7 +9,7 @@
 #include <QTemporaryDir>
 #include <QXmlStreamReader>
 
-#include "TestUtil.h"
+#include "tests/common/TestUtil.h"
 
 namespace {
 

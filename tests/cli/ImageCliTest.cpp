@@ -9,7 +9,7 @@
 
 #include <random>
 
-#include "TestUtil.h"
+#include "tests/common/TestUtil.h"
 
 namespace {
 

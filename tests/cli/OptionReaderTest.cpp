@@ -3,8 +3,8 @@
 
 #include <QTemporaryDir>
 
-#include "TestUtil.h"
 #include "cli/OptionReader.h"
+#include "tests/common/TestUtil.h"
 
 namespace {
 

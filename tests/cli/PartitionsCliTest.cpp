@@ -11,7 +11,7 @@
 #include <tuple>
 #include <vector>
 
-#include "TestUtil.h"
+#include "tests/common/TestUtil.h"
 
 namespace {
 

@@ -5,7 +5,7 @@
 #include <QTemporaryDir>
 #include <random>
 
-#include "TestUtil.h"
+#include "tests/common/TestUtil.h"
 
 namespace {
 

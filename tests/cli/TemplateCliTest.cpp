@@ -11,7 +11,7 @@
 
 #include <zlib.h>
 
-#include "TestUtil.h"
+#include "tests/common/TestUtil.h"
 
 namespace {
 

@@ -7,11 +7,11 @@
 #include <QTemporaryDir>
 #include <QTextStream>
 
+#include "Kernel/Implementation/Common/SystemError.h"
 #include "Kernel/Implementation/Platform/ScriptedBackend.h"
-#include "Kernel/Implementation/Root.h"
-#include "Kernel/Implementation/SystemError.h"
-#include "TestUtil.h"
+#include "Kernel/Implementation/Root/Root.h"
 #include "cli/Write.h"
+#include "tests/common/TestUtil.h"
 
 namespace {
 

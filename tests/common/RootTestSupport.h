@@ -2,9 +2,9 @@
 // scripted back end that answers the geometry, partition and property controls for in-memory disks.
 #pragma once
 
+#include "Kernel/Implementation/Common/RootEnumSource.h"
 #include "Kernel/Implementation/Platform/DeviceControl.h"
 #include "Kernel/Implementation/Platform/ScriptedBackend.h"
-#include "Kernel/Implementation/RootEnumSource.h"
 
 #include <QByteArray>
 #include <QHash>

@@ -2,8 +2,8 @@
 // it emits, has a settable retry count and may hand out another platform back end (a scripted one).
 #pragma once
 
-#include "Implementation/Platform/PlatformBackend.h"
-#include "Implementation/cRoot.h"
+#include "Kernel/Implementation/Common/cRoot.h"
+#include "Kernel/Implementation/Platform/PlatformBackend.h"
 
 #include <QList>
 #include <QObject>

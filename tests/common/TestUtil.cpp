@@ -1,4 +1,4 @@
-#include "TestUtil.h"
+#include "tests/common/TestUtil.h"
 
 #include <QFile>
 #include <QFileInfo>

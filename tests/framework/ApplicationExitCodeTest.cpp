@@ -4,7 +4,7 @@
 #include "ClientFramework/Application.h"
 #include "ClientFramework/Log/ApplicationLog.h"
 
-#include "ScratchHome.h"
+#include "tests/common/ScratchHome.h"
 
 #include <QApplication>
 #include <gtest/gtest.h>

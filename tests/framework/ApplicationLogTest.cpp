@@ -1,7 +1,7 @@
 // Log entries, labels, line format, banners, the log file and the model.
-#include "LogTestUtil.h"
-#include "ScratchHome.h"
-#include "TestUtil.h"
+#include "tests/common/LogTestUtil.h"
+#include "tests/common/ScratchHome.h"
+#include "tests/common/TestUtil.h"
 
 #include "ClientFramework/Log/ApplicationLog.h"
 #include "ClientFramework/Log/KernelLog.h"

@@ -2,10 +2,10 @@
 #include "ClientFramework/CLI/Arguments.h"
 #include "ClientFramework/Processing/ErrorHandling.h"
 #include "ClientFramework/Settings/SettingsDocument.h"
+#include "Kernel/Implementation/Common/SystemError.h"
 #include "Kernel/Implementation/Platform/PlatformFile.h"
 #include "Kernel/Implementation/Platform/ScriptedBackend.h"
-#include "Kernel/Implementation/Root.h"
-#include "Kernel/Implementation/SystemError.h"
+#include "Kernel/Implementation/Root/Root.h"
 
 #include <QDomDocument>
 #include <gtest/gtest.h>

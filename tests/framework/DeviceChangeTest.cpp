@@ -6,7 +6,7 @@
 #include "ClientFramework/Log/ApplicationLog.h"
 #include "Kernel/Implementation/Platform/Linux/UdevMonitor.h"
 
-#include "TestUtil.h"
+#include "tests/common/TestUtil.h"
 
 #include <QHash>
 #include <QSignalSpy>

@@ -4,11 +4,11 @@
 #include "ClientFramework/Application.h"
 #include "ClientFramework/Log/ApplicationLog.h"
 #include "ClientFramework/Log/KernelLog.h"
-#include "Kernel/Implementation/Root.h"
+#include "Kernel/Implementation/Root/Root.h"
 
-#include "LogTestUtil.h"
-#include "RootTestSupport.h"
-#include "ScratchHome.h"
+#include "tests/common/LogTestUtil.h"
+#include "tests/common/RootTestSupport.h"
+#include "tests/common/ScratchHome.h"
 
 #include <QApplication>
 #include <QRegularExpression>

@@ -9,7 +9,7 @@
 #include "ClientFramework/Views/RecentFiles.h"
 #include "ClientFramework/Views/WindowManager.h"
 
-#include "ScratchHome.h"
+#include "tests/common/ScratchHome.h"
 
 #include <QAction>
 #include <QDockWidget>

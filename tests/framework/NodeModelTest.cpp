@@ -1,16 +1,16 @@
 // The three models over the node tree checked by QAbstractItemModelTester while devices arrive
 // and leave and folders are populated; the filter switches and their persistence; folder
 // population on the worker thread with cancellation.
-#include "NodeTestSupport.h"
+#include "tests/framework/NodeTestSupport.h"
 
-#include "NodeTree/DiskBrowserModel.h"
-#include "NodeTree/NodeDevice.h"
-#include "NodeTree/NodeDrive.h"
-#include "NodeTree/NodeFolder.h"
-#include "NodeTree/NodeModel.h"
-#include "NodeTree/NodeRoot.h"
-#include "NodeTree/NodeSortFilterModel.h"
-#include "Threads/NodeTagged.h"
+#include "ClientFramework/NodeTree/DiskBrowserModel.h"
+#include "ClientFramework/NodeTree/NodeDevice.h"
+#include "ClientFramework/NodeTree/NodeDrive.h"
+#include "ClientFramework/NodeTree/NodeFolder.h"
+#include "ClientFramework/NodeTree/NodeModel.h"
+#include "ClientFramework/NodeTree/NodeRoot.h"
+#include "ClientFramework/NodeTree/NodeSortFilterModel.h"
+#include "ClientFramework/Threads/NodeTagged.h"
 
 #include <QAbstractItemModelTester>
 #include <QCoreApplication>

@@ -3,15 +3,15 @@
 // devices of a kernel root; a volume in memory with a folder tree of entries.
 #pragma once
 
-#include "TestUtil.h"
+#include "tests/common/TestUtil.h"
 
-#include "Commands/Commander.h"
-#include "Kernel/Implementation/Device.h"
+#include "ClientFramework/Commands/Commander.h"
+#include "Kernel/Implementation/Devices/Device.h"
 #include "Kernel/Implementation/FS/Entry.h"
 #include "Kernel/Implementation/FS/Volume.h"
 #include "Kernel/Implementation/Images/ImageMemorySource.h"
-#include "Kernel/Implementation/Images/ImageOpen.h"
-#include "Kernel/Implementation/Root.h"
+#include "Kernel/Implementation/Root/ImageOpen.h"
+#include "Kernel/Implementation/Root/Root.h"
 
 #include <QAction>
 #include <QByteArray>

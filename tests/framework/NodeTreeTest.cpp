@@ -1,19 +1,19 @@
 // The node tree over real disk images: keys, texts, nesting of partitions and volumes, status
 // and colours, context menus, default commands, the device nodes following the kernel, and a
 // volume's integrity in its status and the property pane.
-#include "MemoryVolume.h"
-#include "NodeTestSupport.h"
+#include "tests/common/MemoryVolume.h"
+#include "tests/framework/NodeTestSupport.h"
 
-#include "NodeTree/NodeComputer.h"
-#include "NodeTree/NodeCoreList.h"
-#include "NodeTree/NodeDevice.h"
-#include "NodeTree/NodeDrive.h"
-#include "NodeTree/NodeFile.h"
-#include "NodeTree/NodeFolder.h"
-#include "NodeTree/NodePartition.h"
-#include "NodeTree/NodeRoot.h"
-#include "Themes/Theme.h"
-#include "Views/PropertyPane.h"
+#include "ClientFramework/NodeTree/NodeComputer.h"
+#include "ClientFramework/NodeTree/NodeCoreList.h"
+#include "ClientFramework/NodeTree/NodeDevice.h"
+#include "ClientFramework/NodeTree/NodeDrive.h"
+#include "ClientFramework/NodeTree/NodeFile.h"
+#include "ClientFramework/NodeTree/NodeFolder.h"
+#include "ClientFramework/NodeTree/NodePartition.h"
+#include "ClientFramework/NodeTree/NodeRoot.h"
+#include "ClientFramework/Themes/Theme.h"
+#include "ClientFramework/Views/PropertyPane.h"
 
 #include <QAction>
 #include <QCoreApplication>

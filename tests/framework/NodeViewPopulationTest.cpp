@@ -1,11 +1,11 @@
 // What both node views tell the status bar of folder populations: "Populating %1" as each starts,
 // and an end only when the last one running has ended (two run at once on their workers).
-#include "NodeTestSupport.h"
+#include "tests/framework/NodeTestSupport.h"
 
-#include "NodeTree/DiskBrowserModel.h"
-#include "NodeTree/NodeDrive.h"
-#include "Views/DiskBrowserView.h"
-#include "Views/DiskExplorerView.h"
+#include "ClientFramework/NodeTree/DiskBrowserModel.h"
+#include "ClientFramework/NodeTree/NodeDrive.h"
+#include "ClientFramework/Views/DiskBrowserView.h"
+#include "ClientFramework/Views/DiskExplorerView.h"
 
 #include <QCoreApplication>
 #include <QSignalSpy>

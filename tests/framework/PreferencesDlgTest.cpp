@@ -1,6 +1,6 @@
 // The preferences dialog: pages contributed by feature commanders, OK / Apply / Cancel / "Restore
 // Defaults", what reaches the settings document and the file, and the "Preferences..." command.
-#include "ScratchHome.h"
+#include "tests/common/ScratchHome.h"
 
 #include "ClientFramework/Commands/Commander.h"
 #include "ClientFramework/Commands/FeatureCommander.h"

@@ -1,6 +1,6 @@
 // The application log's page of the preferences dialog: its fields over the "log" element, the
 // option bits it does not own, empty fields, and the running log taking the options over.
-#include "ScratchHome.h"
+#include "tests/common/ScratchHome.h"
 
 #include "ClientFramework/Commands/Commander.h"
 #include "ClientFramework/Log/ApplicationLog.h"

@@ -1,7 +1,7 @@
 // The settings file: creation, corrupt files, found-or-created elements, saving, path macros.
-#include "LogTestUtil.h"
-#include "ScratchHome.h"
-#include "TestUtil.h"
+#include "tests/common/LogTestUtil.h"
+#include "tests/common/ScratchHome.h"
+#include "tests/common/TestUtil.h"
 
 #include "ClientFramework/Settings/PathMacros.h"
 #include "ClientFramework/Settings/SettingsDocument.h"

@@ -1,6 +1,6 @@
 // High-DPI decision, the single-instance guard and error reporting.
-#include "LogTestUtil.h"
-#include "RecordingDialogs.h"
+#include "tests/common/LogTestUtil.h"
+#include "tests/common/RecordingDialogs.h"
 
 #include "ClientFramework/GenericError.h"
 #include "ClientFramework/HighDpi.h"

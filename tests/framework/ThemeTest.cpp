@@ -1,6 +1,6 @@
 // Theme documents: the light theme's node palette, a dark theme with the same entries, lookups
 // of missing entries and palettes, and documents that are not themes.
-#include "Themes/Theme.h"
+#include "ClientFramework/Themes/Theme.h"
 
 #include <gtest/gtest.h>
 

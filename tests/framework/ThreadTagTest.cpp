@@ -1,7 +1,7 @@
 // Worker threads and their tags: state changes, cancellation seen by the worker, progress text
 // written by the worker while the interface thread reads it.
-#include "Threads/Generic.h"
-#include "Threads/Tag.h"
+#include "ClientFramework/Threads/Generic.h"
+#include "ClientFramework/Threads/Tag.h"
 
 #include <QCoreApplication>
 #include <QSignalSpy>

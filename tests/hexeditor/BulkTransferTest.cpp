@@ -6,10 +6,10 @@
 #include <QSignalSpy>
 #include <QTemporaryDir>
 
-#include "StorageTestMedium.h"
-#include "TestUtil.h"
 #include "hexeditor/BulkTransfer.h"
 #include "hexeditor/Storage.h"
+#include "tests/common/TestUtil.h"
+#include "tests/hexeditor/StorageTestMedium.h"
 
 using namespace HexEditor;
 using HexEditor::BulkTransfer::Thread;

@@ -2,8 +2,8 @@
 #include <QClipboard>
 #include <QMimeData>
 
-#include "EditorCtrlFixture.h"
 #include "hexeditor/Clipboard.h"
+#include "tests/hexeditor/EditorCtrlFixture.h"
 
 using HexEditor::DiskArea;
 using HexEditor::EditorCtrl;

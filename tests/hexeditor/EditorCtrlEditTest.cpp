@@ -1,7 +1,7 @@
 #include <QDomDocument>
 
-#include "EditorCtrlFixture.h"
 #include "hexeditor/FillBlockDlg.h"
+#include "tests/hexeditor/EditorCtrlFixture.h"
 
 #include <QDialogButtonBox>
 #include <QLabel>

@@ -8,7 +8,7 @@
 
 #include <cstring>
 
-#include "Kernel/Implementation/cStorage.h"
+#include "Kernel/Implementation/Common/cStorage.h"
 
 class EditorCtrlFakeDisk : public cStorage
 {

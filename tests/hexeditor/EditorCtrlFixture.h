@@ -8,10 +8,10 @@
 
 #include <memory>
 
-#include "EditorCtrlFakeDisk.h"
-#include "RecordingDialogs.h"
 #include "hexeditor/EditorCtrl.h"
 #include "hexeditor/Storage.h"
+#include "tests/common/RecordingDialogs.h"
+#include "tests/hexeditor/EditorCtrlFakeDisk.h"
 
 class EditorCtrlFixture : public ::testing::Test
 {

@@ -1,7 +1,7 @@
 #include <QScrollBar>
 #include <QWheelEvent>
 
-#include "EditorCtrlFixture.h"
+#include "tests/hexeditor/EditorCtrlFixture.h"
 
 using HexEditor::DiskArea;
 using HexEditor::EditorCtrl;

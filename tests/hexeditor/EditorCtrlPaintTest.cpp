@@ -3,8 +3,8 @@
 #include <QMenu>
 #include <QScrollBar>
 
-#include "EditorCtrlFixture.h"
 #include "hexeditor/PaintPalette.h"
+#include "tests/hexeditor/EditorCtrlFixture.h"
 
 using HexEditor::DiskArea;
 using HexEditor::EditorCtrl;

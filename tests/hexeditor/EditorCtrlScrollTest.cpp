@@ -1,6 +1,6 @@
 #include <QScrollBar>
 
-#include "EditorCtrlFixture.h"
+#include "tests/hexeditor/EditorCtrlFixture.h"
 
 using HexEditor::Metrics;
 

@@ -1,7 +1,7 @@
 #include <QFile>
 #include <QTemporaryDir>
 
-#include "EditorCtrlFixture.h"
+#include "tests/hexeditor/EditorCtrlFixture.h"
 
 using HexEditor::DiskArea;
 using HexEditor::EditorCtrl;

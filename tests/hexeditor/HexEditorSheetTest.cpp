@@ -1,14 +1,14 @@
 // The hex editor's preferences page: what it reads from and writes to the editor settings, the
 // choices it offers, restoring the defaults, and applying a save to the open hex editor views.
-#include "RecordingDialogs.h"
-#include "ScratchHome.h"
-#include "TestUtil.h"
+#include "tests/common/RecordingDialogs.h"
+#include "tests/common/ScratchHome.h"
+#include "tests/common/TestUtil.h"
 
 #include "ClientFramework/Commands/Commander.h"
 #include "ClientFramework/Preferences/PreferencesCommand.h"
 #include "ClientFramework/Preferences/PreferencesDlg.h"
 #include "ClientFramework/Settings/SettingsDocument.h"
-#include "Kernel/Implementation/Root.h"
+#include "Kernel/Implementation/Root/Root.h"
 #include "hexeditor/Commander.h"
 #include "hexeditor/EditorCtrl.h"
 #include "hexeditor/HexEditorSheet.h"

@@ -4,11 +4,11 @@
 
 #include <QSignalSpy>
 
-#include "Kernel/Implementation/SystemError.h"
-#include "StorageTestMedium.h"
+#include "Kernel/Implementation/Common/SystemError.h"
 #include "hexeditor/FillPattern.h"
 #include "hexeditor/Storage.h"
 #include "hexeditor/UndoStack.h"
+#include "tests/hexeditor/StorageTestMedium.h"
 
 using namespace HexEditor;
 

@@ -8,15 +8,13 @@
 #include <QRegularExpression>
 #include <QTemporaryDir>
 
-#include "Kernel/Implementation/Device.h"
+#include "Kernel/Implementation/Common/SystemError.h"
+#include "Kernel/Implementation/Devices/Device.h"
 #include "Kernel/Implementation/FS/Entry.h"
 #include "Kernel/Implementation/FS/Volume.h"
-#include "Kernel/Implementation/Images/ImageOpen.h"
-#include "Kernel/Implementation/Partition.h"
-#include "Kernel/Implementation/Root.h"
-#include "Kernel/Implementation/SystemError.h"
-#include "StorageTestMedium.h"
-#include "TestUtil.h"
+#include "Kernel/Implementation/Partitions/Partition.h"
+#include "Kernel/Implementation/Root/ImageOpen.h"
+#include "Kernel/Implementation/Root/Root.h"
 #include "hexeditor/StorageFactory.h"
 #include "hexeditor/StorageFile.h"
 #include "hexeditor/StorageLayout.h"
@@ -24,6 +22,8 @@
 #include "hexeditor/StoragePlainFile.h"
 #include "hexeditor/StorageVolume.h"
 #include "hexeditor/UndoStack.h"
+#include "tests/common/TestUtil.h"
+#include "tests/hexeditor/StorageTestMedium.h"
 
 using namespace HexEditor;
 

@@ -5,10 +5,10 @@
 #include <QDir>
 #include <QTemporaryDir>
 
-#include "Kernel/Implementation/Device.h"
-#include "Kernel/Implementation/Root.h"
-#include "TestUtil.h"
+#include "Kernel/Implementation/Devices/Device.h"
+#include "Kernel/Implementation/Root/Root.h"
 #include "hexeditor/StorageFactory.h"
+#include "tests/common/TestUtil.h"
 
 using namespace HexEditor;
 

@@ -11,7 +11,7 @@
 #include <mutex>
 #include <set>
 
-#include "Kernel/Implementation/cStorage.h"
+#include "Kernel/Implementation/Common/cStorage.h"
 
 class MemoryMedium : public cStorage
 {

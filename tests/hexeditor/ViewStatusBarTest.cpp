@@ -2,13 +2,13 @@
 // a block transfer of the view: its progress and stop button, and its result reaching the user.
 #include "hexeditor/StatusCtrl.h"
 
-#include "LogTestUtil.h"
-#include "RecordingDialogs.h"
-#include "StorageTestMedium.h"
-#include "TestUtil.h"
 #include "hexeditor/EditorCtrl.h"
 #include "hexeditor/Storage.h"
 #include "hexeditor/View.h"
+#include "tests/common/LogTestUtil.h"
+#include "tests/common/RecordingDialogs.h"
+#include "tests/common/TestUtil.h"
+#include "tests/hexeditor/StorageTestMedium.h"
 
 #include <QLabel>
 #include <QProgressBar>

@@ -1,8 +1,8 @@
-#include "Detect.h"
+#include "Kernel/Implementation/FS/Detect.h"
 
-#include "../Partition.h"
-#include "../cDevice.h"
-#include "DetectBytes.h"
+#include "Kernel/Implementation/Common/cDevice.h"
+#include "Kernel/Implementation/FS/DetectBytes.h"
+#include "Kernel/Implementation/Partitions/Partition.h"
 
 #include <vector>
 

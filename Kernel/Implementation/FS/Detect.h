@@ -7,7 +7,7 @@
 #include <cstddef>
 #include <cstdint>
 
-#include "../DeviceInfo.h"
+#include "Kernel/Implementation/Common/DeviceInfo.h"
 
 class cStorage;
 class cPartition;

@@ -6,7 +6,7 @@
 #include <cstdint>
 #include <cstring>
 
-#include "../ByteOrder.h"
+#include "Kernel/Implementation/Common/ByteOrder.h"
 
 namespace DiskBytes {
 

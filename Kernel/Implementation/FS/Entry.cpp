@@ -1,6 +1,6 @@
-#include "Entry.h"
+#include "Kernel/Implementation/FS/Entry.h"
 
-#include "Volume.h"
+#include "Kernel/Implementation/FS/Volume.h"
 
 #include <algorithm>
 #include <cstring>

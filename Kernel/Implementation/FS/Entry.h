@@ -9,8 +9,8 @@
 #include <memory>
 #include <vector>
 
-#include "../cStorage.h"
-#include "EntryHandle.h"
+#include "Kernel/Implementation/Common/cStorage.h"
+#include "Kernel/Implementation/FS/EntryHandle.h"
 
 class CVolume;
 

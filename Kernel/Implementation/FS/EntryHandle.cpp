@@ -1,6 +1,6 @@
-#include "EntryHandle.h"
+#include "Kernel/Implementation/FS/EntryHandle.h"
 
-#include "../cStorage.h"
+#include "Kernel/Implementation/Common/cStorage.h"
 
 #include <algorithm>
 #include <cstring>

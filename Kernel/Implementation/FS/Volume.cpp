@@ -1,8 +1,8 @@
-#include "Volume.h"
+#include "Kernel/Implementation/FS/Volume.h"
 
-#include "../Platform/PlatformFile.h"
-#include "../cRoot.h"
-#include "VolumeIntegrity.h"
+#include "Kernel/Implementation/Common/cRoot.h"
+#include "Kernel/Implementation/FS/VolumeIntegrity.h"
+#include "Kernel/Implementation/Platform/PlatformFile.h"
 
 #include <QFileInfo>
 

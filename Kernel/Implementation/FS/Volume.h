@@ -13,9 +13,9 @@
 #include <mutex>
 #include <vector>
 
-#include "../DeviceInfo.h"
-#include "../cStorage.h"
-#include "Entry.h"
+#include "Kernel/Implementation/Common/DeviceInfo.h"
+#include "Kernel/Implementation/Common/cStorage.h"
+#include "Kernel/Implementation/FS/Entry.h"
 
 class cRoot;
 class cPartition;

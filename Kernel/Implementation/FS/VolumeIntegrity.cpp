@@ -1,4 +1,4 @@
-#include "VolumeIntegrity.h"
+#include "Kernel/Implementation/FS/VolumeIntegrity.h"
 
 #include <QHash>
 

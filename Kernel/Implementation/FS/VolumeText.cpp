@@ -1,6 +1,6 @@
-#include "VolumeText.h"
+#include "Kernel/Implementation/FS/VolumeText.h"
 
-#include "DetectBytes.h"
+#include "Kernel/Implementation/FS/DetectBytes.h"
 
 namespace VolumeText {
 

@@ -1,7 +1,7 @@
-#include "Detect.h"
-#include "DetectBytes.h"
-#include "Volume.h"
-#include "VolumeText.h"
+#include "Kernel/Implementation/FS/Detect.h"
+#include "Kernel/Implementation/FS/DetectBytes.h"
+#include "Kernel/Implementation/FS/Volume.h"
+#include "Kernel/Implementation/FS/VolumeText.h"
 
 #include <vector>
 

@@ -5,7 +5,7 @@
 #include <cstddef>
 #include <cstdint>
 
-#include "../ByteOrder.h"
+#include "Kernel/Implementation/Common/ByteOrder.h"
 
 namespace ImageBytes {
 

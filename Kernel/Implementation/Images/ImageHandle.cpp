@@ -1,9 +1,9 @@
-#include "ImageHandle.h"
+#include "Kernel/Implementation/Images/ImageHandle.h"
 
-#include "Implementation/Platform/PlatformFile.h"
-#include "Implementation/Platform/PlatformFileX.h"
-#include "Implementation/SystemError.h"
-#include "Implementation/cRoot.h"
+#include "Kernel/Implementation/Common/SystemError.h"
+#include "Kernel/Implementation/Common/cRoot.h"
+#include "Kernel/Implementation/Platform/PlatformFile.h"
+#include "Kernel/Implementation/Platform/PlatformFileX.h"
 
 #include <QMutexLocker>
 

@@ -10,7 +10,7 @@
 #include <QStringList>
 #include <cstdint>
 
-#include "Implementation/DeviceInfo.h"
+#include "Kernel/Implementation/Common/DeviceInfo.h"
 
 class cRoot;
 class cStorage;

@@ -1,4 +1,4 @@
-#include "ImageHandleBackup.h"
+#include "Kernel/Implementation/Images/ImageHandleBackup.h"
 
 CImageHandle_Backup::CImageHandle_Backup(cRoot *root, const QByteArray &first, const QByteArray &second)
     : CImageHandle(root, ImageKind::OwnBackup, 9), m_first(first), m_second(second)

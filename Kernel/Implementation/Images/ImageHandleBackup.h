@@ -2,7 +2,7 @@
 // and every transfer fails.
 #pragma once
 
-#include "ImageHandle.h"
+#include "Kernel/Implementation/Images/ImageHandle.h"
 
 class CImageHandle_Backup : public CImageHandle
 {

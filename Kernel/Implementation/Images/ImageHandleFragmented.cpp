@@ -1,6 +1,6 @@
-#include "ImageHandleFragmented.h"
+#include "Kernel/Implementation/Images/ImageHandleFragmented.h"
 
-#include "Implementation/Platform/PlatformFile.h"
+#include "Kernel/Implementation/Platform/PlatformFile.h"
 
 #include <cstring>
 

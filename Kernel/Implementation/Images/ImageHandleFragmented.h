@@ -1,7 +1,7 @@
 // Pieces of a disk placed at given sectors: sectors that no piece covers read as zeros.
 #pragma once
 
-#include "ImageHandle.h"
+#include "Kernel/Implementation/Images/ImageHandle.h"
 
 class CImageHandle_Fragmented : public CImageHandle
 {

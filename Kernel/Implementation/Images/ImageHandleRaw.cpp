@@ -1,6 +1,6 @@
-#include "ImageHandleRaw.h"
+#include "Kernel/Implementation/Images/ImageHandleRaw.h"
 
-#include "Implementation/Platform/PlatformFile.h"
+#include "Kernel/Implementation/Platform/PlatformFile.h"
 
 CImageHandle_Raw::CImageHandle_Raw(cRoot *root, const QStringList &files, std::uint8_t sectorShift)
     : CImageHandle(root, ImageKind::RawImage, sectorShift)

@@ -1,7 +1,7 @@
 // A plain sector dump, possibly split into several files that are read back as one.
 #pragma once
 
-#include "ImageHandle.h"
+#include "Kernel/Implementation/Images/ImageHandle.h"
 
 class CImageHandle_Raw : public CImageHandle
 {

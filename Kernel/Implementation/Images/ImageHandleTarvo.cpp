@@ -1,7 +1,7 @@
-#include "ImageHandleTarvo.h"
+#include "Kernel/Implementation/Images/ImageHandleTarvo.h"
 
-#include "ImageBytes.h"
-#include "Implementation/SystemError.h"
+#include "Kernel/Implementation/Common/SystemError.h"
+#include "Kernel/Implementation/Images/ImageBytes.h"
 
 #include <algorithm>
 #include <cstring>

@@ -1,8 +1,8 @@
 // The system's own read-only, block-compressed disk image ("Tarvo Disk Image").
 #pragma once
 
-#include "ImageHandle.h"
-#include "TarvoFormat.h"
+#include "Kernel/Implementation/Images/ImageHandle.h"
+#include "Kernel/Implementation/Images/TarvoFormat.h"
 
 #include <functional>
 #include <vector>

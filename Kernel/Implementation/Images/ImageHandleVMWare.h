@@ -3,7 +3,7 @@
 // on the virtual disk.
 #pragma once
 
-#include "ImageHandle.h"
+#include "Kernel/Implementation/Images/ImageHandle.h"
 
 #include <vector>
 

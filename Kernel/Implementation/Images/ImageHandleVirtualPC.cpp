@@ -1,8 +1,8 @@
-#include "ImageHandleVirtualPC.h"
+#include "Kernel/Implementation/Images/ImageHandleVirtualPC.h"
 
-#include "ImageBytes.h"
-#include "Implementation/Platform/PlatformFile.h"
-#include "Implementation/SystemError.h"
+#include "Kernel/Implementation/Common/SystemError.h"
+#include "Kernel/Implementation/Images/ImageBytes.h"
+#include "Kernel/Implementation/Platform/PlatformFile.h"
 
 #include <QFileInfo>
 

@@ -3,7 +3,7 @@
 // a further file named like the first with the extension ".v%1".
 #pragma once
 
-#include "ImageHandle.h"
+#include "Kernel/Implementation/Images/ImageHandle.h"
 
 #include <vector>
 

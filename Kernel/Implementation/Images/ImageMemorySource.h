@@ -2,7 +2,7 @@
 // image found inside another image, a checked copy, a fuzzing input) through CPlatformFileX.
 #pragma once
 
-#include "Implementation/cStorage.h"
+#include "Kernel/Implementation/Common/cStorage.h"
 
 #include <QByteArray>
 #include <cstring>

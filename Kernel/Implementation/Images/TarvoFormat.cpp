@@ -1,6 +1,6 @@
-#include "TarvoFormat.h"
+#include "Kernel/Implementation/Images/TarvoFormat.h"
 
-#include "ImageBytes.h"
+#include "Kernel/Implementation/Images/ImageBytes.h"
 
 #include <cstring>
 #include <zlib.h>

@@ -1,9 +1,9 @@
-#include "TarvoWriter.h"
+#include "Kernel/Implementation/Images/TarvoWriter.h"
 
-#include "ImageBytes.h"
-#include "Implementation/KernelVersion.h"
-#include "Implementation/Platform/PlatformFile.h"
-#include "TarvoFormat.h"
+#include "Kernel/Implementation/Common/KernelVersion.h"
+#include "Kernel/Implementation/Images/ImageBytes.h"
+#include "Kernel/Implementation/Images/TarvoFormat.h"
+#include "Kernel/Implementation/Platform/PlatformFile.h"
 
 #include <QDateTime>
 

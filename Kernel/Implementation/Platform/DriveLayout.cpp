@@ -1,6 +1,6 @@
-#include "DriveLayout.h"
+#include "Kernel/Implementation/Platform/DriveLayout.h"
 
-#include "../SystemError.h"
+#include "Kernel/Implementation/Common/SystemError.h"
 
 #include <cstring>
 

@@ -2,7 +2,7 @@
 // end gives it: the answer fits the caller's buffer or the call fails with "buffer too small".
 #pragma once
 
-#include "DeviceControl.h"
+#include "Kernel/Implementation/Platform/DeviceControl.h"
 
 #include <QByteArray>
 #include <QList>

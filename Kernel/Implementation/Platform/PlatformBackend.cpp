@@ -1,6 +1,6 @@
-#include "PlatformBackend.h"
+#include "Kernel/Implementation/Platform/PlatformBackend.h"
 
-#include "Linux/LinuxBackend.h"
+#include "Kernel/Implementation/Platform/Linux/LinuxBackend.h"
 
 IPlatformBackend::~IPlatformBackend() = default;
 

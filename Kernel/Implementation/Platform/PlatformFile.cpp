@@ -1,10 +1,10 @@
-#include "PlatformFile.h"
+#include "Kernel/Implementation/Platform/PlatformFile.h"
 
-#include "DeviceControl.h"
-#include "PlatformOps.h"
+#include "Kernel/Implementation/Platform/DeviceControl.h"
+#include "Kernel/Implementation/Platform/PlatformOps.h"
 
-#include "../SystemError.h"
-#include "../cRoot.h"
+#include "Kernel/Implementation/Common/SystemError.h"
+#include "Kernel/Implementation/Common/cRoot.h"
 
 #include <QMutexLocker>
 

@@ -4,7 +4,7 @@
 // opens it again for writing, so nothing that only reads ever holds a medium writable.
 #pragma once
 
-#include "PlatformBackend.h"
+#include "Kernel/Implementation/Platform/PlatformBackend.h"
 
 #include <QList>
 #include <QRecursiveMutex>

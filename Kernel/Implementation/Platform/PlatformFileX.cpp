@@ -1,7 +1,7 @@
-#include "PlatformFileX.h"
+#include "Kernel/Implementation/Platform/PlatformFileX.h"
 
-#include "Implementation/SystemError.h"
-#include "Implementation/cStorage.h"
+#include "Kernel/Implementation/Common/SystemError.h"
+#include "Kernel/Implementation/Common/cStorage.h"
 
 CPlatformFileX::CPlatformFileX(cRoot *owner, const QString &name, cStorage *source)
     : CPlatformFile(owner, name, PlatformKind::File), m_source(source)

@@ -2,7 +2,7 @@
 // platform file of kind File: reads go through the source's byte read, writes are refused.
 #pragma once
 
-#include "PlatformFile.h"
+#include "Kernel/Implementation/Platform/PlatformFile.h"
 
 class cStorage;
 

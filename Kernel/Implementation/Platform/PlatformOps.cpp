@@ -1,9 +1,9 @@
-#include "PlatformOps.h"
+#include "Kernel/Implementation/Platform/PlatformOps.h"
 
-#include "PlatformFile.h"
+#include "Kernel/Implementation/Platform/PlatformFile.h"
 
-#include "../SystemError.h"
-#include "../cRoot.h"
+#include "Kernel/Implementation/Common/SystemError.h"
+#include "Kernel/Implementation/Common/cRoot.h"
 
 #include <QStringDecoder>
 #include <QStringEncoder>

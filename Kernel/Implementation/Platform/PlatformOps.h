@@ -2,7 +2,7 @@
 // and its back end.
 #pragma once
 
-#include "PlatformBackend.h"
+#include "Kernel/Implementation/Platform/PlatformBackend.h"
 
 #include <QString>
 #include <QStringList>

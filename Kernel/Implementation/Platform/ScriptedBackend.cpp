@@ -1,6 +1,6 @@
-#include "ScriptedBackend.h"
+#include "Kernel/Implementation/Platform/ScriptedBackend.h"
 
-#include "../SystemError.h"
+#include "Kernel/Implementation/Common/SystemError.h"
 
 #include <QMutexLocker>
 

@@ -2,7 +2,7 @@
 // answer with an error, a short count or prepared device-control data. Every call is logged.
 #pragma once
 
-#include "PlatformBackend.h"
+#include "Kernel/Implementation/Platform/PlatformBackend.h"
 
 #include <QByteArray>
 #include <QMap>

@@ -6,7 +6,7 @@
 
 #include <cstdint>
 
-#include "TemplateType.h"
+#include "hexeditor/templates/core/TemplateType.h"
 
 namespace HexEditor::Templates {
 

@@ -1,9 +1,9 @@
-#include "Catalog.h"
+#include "hexeditor/templates/core/Catalog.h"
 
-#include "GptBuilder.h"
-#include "Kernel/Implementation/cStorage.h"
-#include "LdmBuilders.h"
-#include "MbrBuilder.h"
+#include "Kernel/Implementation/Common/cStorage.h"
+#include "hexeditor/templates/core/GptBuilder.h"
+#include "hexeditor/templates/core/LdmBuilders.h"
+#include "hexeditor/templates/core/MbrBuilder.h"
 
 namespace HexEditor::Templates {
 

@@ -7,8 +7,8 @@
 #include <cstdint>
 #include <memory>
 
-#include "Builder.h"
-#include "TemplateType.h"
+#include "hexeditor/templates/core/Builder.h"
+#include "hexeditor/templates/core/TemplateType.h"
 
 enum class StorageKind : std::uint32_t;
 

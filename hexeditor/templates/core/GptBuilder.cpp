@@ -1,13 +1,13 @@
-#include "GptBuilder.h"
+#include "hexeditor/templates/core/GptBuilder.h"
 
 #include <QCoreApplication>
 
-#include "Kernel/Implementation/GptReader.h"
-#include "Kernel/Implementation/HardwareInfo.h"
-#include "Record.h"
-#include "SizeMath.h"
-#include "Source.h"
-#include "Values.h"
+#include "Kernel/Implementation/Partitions/GptReader.h"
+#include "Kernel/Implementation/Report/HardwareInfo.h"
+#include "hexeditor/templates/core/Record.h"
+#include "hexeditor/templates/core/SizeMath.h"
+#include "hexeditor/templates/core/Source.h"
+#include "hexeditor/templates/core/Values.h"
 
 namespace HexEditor::Templates {
 

@@ -4,7 +4,7 @@
 #include <QByteArray>
 #include <QString>
 
-#include "Builder.h"
+#include "hexeditor/templates/core/Builder.h"
 
 namespace HexEditor::Templates {
 

@@ -1,9 +1,9 @@
-#include "LdmBuilders.h"
+#include "hexeditor/templates/core/LdmBuilders.h"
 
 #include <QCoreApplication>
 
-#include "Record.h"
-#include "Values.h"
+#include "hexeditor/templates/core/Record.h"
+#include "hexeditor/templates/core/Values.h"
 
 namespace HexEditor::Templates {
 

@@ -2,7 +2,7 @@
 // manager database header, transaction log and the 128-byte VBLK records. All big-endian.
 #pragma once
 
-#include "Builder.h"
+#include "hexeditor/templates/core/Builder.h"
 
 namespace HexEditor::Templates {
 

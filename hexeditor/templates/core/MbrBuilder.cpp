@@ -1,16 +1,16 @@
-#include "MbrBuilder.h"
+#include "hexeditor/templates/core/MbrBuilder.h"
 
 #include <QCoreApplication>
 
-#include "Catalog.h"
-#include "Kernel/Implementation/DeviceInfo.h"
-#include "Kernel/Implementation/HardwareInfo.h"
-#include "Kernel/Implementation/MbrTable.h"
-#include "Kernel/Implementation/PartScanKinds.h"
-#include "Record.h"
-#include "SizeMath.h"
-#include "Source.h"
-#include "Values.h"
+#include "Kernel/Implementation/Common/DeviceInfo.h"
+#include "Kernel/Implementation/Partitions/MbrTable.h"
+#include "Kernel/Implementation/Partitions/PartScanKinds.h"
+#include "Kernel/Implementation/Report/HardwareInfo.h"
+#include "hexeditor/templates/core/Catalog.h"
+#include "hexeditor/templates/core/Record.h"
+#include "hexeditor/templates/core/SizeMath.h"
+#include "hexeditor/templates/core/Source.h"
+#include "hexeditor/templates/core/Values.h"
 
 namespace HexEditor::Templates {
 

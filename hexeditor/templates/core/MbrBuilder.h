@@ -3,7 +3,7 @@
 
 #include <QString>
 
-#include "Builder.h"
+#include "hexeditor/templates/core/Builder.h"
 
 namespace HexEditor::Templates {
 

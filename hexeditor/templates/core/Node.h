@@ -8,8 +8,8 @@
 #include <memory>
 #include <vector>
 
-#include "FieldFormat.h"
-#include "TemplateType.h"
+#include "hexeditor/templates/core/FieldFormat.h"
+#include "hexeditor/templates/core/TemplateType.h"
 
 namespace HexEditor::Templates {
 

@@ -1,7 +1,7 @@
-#include "Record.h"
+#include "hexeditor/templates/core/Record.h"
 
-#include "Source.h"
-#include "Values.h"
+#include "hexeditor/templates/core/Source.h"
+#include "hexeditor/templates/core/Values.h"
 
 namespace HexEditor::Templates {
 

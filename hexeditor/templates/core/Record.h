@@ -14,8 +14,8 @@
 #include <memory>
 #include <optional>
 
-#include "Builder.h"
-#include "Node.h"
+#include "hexeditor/templates/core/Builder.h"
+#include "hexeditor/templates/core/Node.h"
 
 namespace HexEditor::Templates {
 

@@ -1,4 +1,4 @@
-#include "TemplateType.h"
+#include "hexeditor/templates/core/TemplateType.h"
 
 #include <QCoreApplication>
 

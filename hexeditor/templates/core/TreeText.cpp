@@ -1,8 +1,8 @@
-#include "TreeText.h"
+#include "hexeditor/templates/core/TreeText.h"
 
 #include <QJsonArray>
 
-#include "Record.h"
+#include "hexeditor/templates/core/Record.h"
 
 namespace HexEditor::Templates {
 

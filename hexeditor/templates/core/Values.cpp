@@ -1,4 +1,4 @@
-#include "Values.h"
+#include "hexeditor/templates/core/Values.h"
 
 #include <QDateTime>
 #include <QRegularExpression>

@@ -10,7 +10,7 @@
 #include <cstdint>
 #include <optional>
 
-#include "FieldFormat.h"
+#include "hexeditor/templates/core/FieldFormat.h"
 
 namespace HexEditor::Templates::Values {
 

@@ -2,7 +2,7 @@
 // area, the container's object map and the first volume's superblock (its name is the label).
 #pragma once
 
-#include "VolumeOther.h"
+#include "Kernel/Implementation/FS/Other/VolumeOther.h"
 
 BRINDLE_OTHER_ENTRY(CEntryApFS)
 

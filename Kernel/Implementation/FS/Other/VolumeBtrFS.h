@@ -2,7 +2,7 @@
 // system's own size; free space from the superblock's byte counts.
 #pragma once
 
-#include "VolumeOther.h"
+#include "Kernel/Implementation/FS/Other/VolumeOther.h"
 
 BRINDLE_OTHER_ENTRY(CEntryBtrFS)
 

@@ -2,7 +2,7 @@
 // 2048-byte sectors, the root directory record.
 #pragma once
 
-#include "VolumeOther.h"
+#include "Kernel/Implementation/FS/Other/VolumeOther.h"
 
 BRINDLE_OTHER_ENTRY(CEntryCDFS)
 

@@ -1,8 +1,8 @@
-#include "VolumeJFS.h"
+#include "Kernel/Implementation/FS/Other/VolumeJFS.h"
 
-#include "../Detect.h"
-#include "../DetectBytes.h"
-#include "../VolumeText.h"
+#include "Kernel/Implementation/FS/Detect.h"
+#include "Kernel/Implementation/FS/DetectBytes.h"
+#include "Kernel/Implementation/FS/VolumeText.h"
 
 using namespace DiskBytes;
 

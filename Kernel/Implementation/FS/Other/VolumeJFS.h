@@ -1,7 +1,7 @@
 // JFS: the superblock at 32 KiB and its spare at 60 KiB; aggregate blocks as clusters.
 #pragma once
 
-#include "VolumeOther.h"
+#include "Kernel/Implementation/FS/Other/VolumeOther.h"
 
 BRINDLE_OTHER_ENTRY(CEntryJFS)
 

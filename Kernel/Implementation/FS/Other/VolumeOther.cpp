@@ -1,6 +1,6 @@
-#include "VolumeOther.h"
+#include "Kernel/Implementation/FS/Other/VolumeOther.h"
 
-#include "../DetectBytes.h"
+#include "Kernel/Implementation/FS/DetectBytes.h"
 
 bool CVolumeOther::ReadBlock(std::uint64_t offset, std::size_t length, std::vector<std::uint8_t> &out)
 {

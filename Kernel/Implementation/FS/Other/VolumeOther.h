@@ -2,7 +2,7 @@
 // the volume and building the root and service entries with the entry class of each.
 #pragma once
 
-#include "../Volume.h"
+#include "Kernel/Implementation/FS/Volume.h"
 
 #include <vector>
 

@@ -1,7 +1,7 @@
-#include "VolumeReFS.h"
+#include "Kernel/Implementation/FS/Other/VolumeReFS.h"
 
-#include "../Detect.h"
-#include "../DetectBytes.h"
+#include "Kernel/Implementation/FS/Detect.h"
+#include "Kernel/Implementation/FS/DetectBytes.h"
 
 using namespace DiskBytes;
 

@@ -2,7 +2,7 @@
 // sector. The metadata structures behind it are not read.
 #pragma once
 
-#include "VolumeOther.h"
+#include "Kernel/Implementation/FS/Other/VolumeOther.h"
 
 BRINDLE_OTHER_ENTRY(CEntryReFS)
 

@@ -1,7 +1,7 @@
-#include "VolumeUDF.h"
+#include "Kernel/Implementation/FS/Other/VolumeUDF.h"
 
-#include "../DetectBytes.h"
-#include "../VolumeText.h"
+#include "Kernel/Implementation/FS/DetectBytes.h"
+#include "Kernel/Implementation/FS/VolumeText.h"
 
 using namespace DiskBytes;
 

@@ -2,7 +2,7 @@
 // sequence they point to, the logical volume identifier as label.
 #pragma once
 
-#include "VolumeOther.h"
+#include "Kernel/Implementation/FS/Other/VolumeOther.h"
 
 BRINDLE_OTHER_ENTRY(CEntryUDF)
 

@@ -2,7 +2,7 @@
 // group, fragments as clusters.
 #pragma once
 
-#include "VolumeOther.h"
+#include "Kernel/Implementation/FS/Other/VolumeOther.h"
 
 BRINDLE_OTHER_ENTRY(CEntryUFS)
 

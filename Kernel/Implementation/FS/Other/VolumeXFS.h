@@ -2,7 +2,7 @@
 // AGF and AGI of every allocation group; file-system blocks as clusters.
 #pragma once
 
-#include "VolumeOther.h"
+#include "Kernel/Implementation/FS/Other/VolumeOther.h"
 
 BRINDLE_OTHER_ENTRY(CEntryXFS)
 

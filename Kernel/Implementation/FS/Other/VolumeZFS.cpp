@@ -1,7 +1,7 @@
-#include "VolumeZFS.h"
+#include "Kernel/Implementation/FS/Other/VolumeZFS.h"
 
-#include "../Detect.h"
-#include "../DetectBytes.h"
+#include "Kernel/Implementation/FS/Detect.h"
+#include "Kernel/Implementation/FS/DetectBytes.h"
 
 #include <cstring>
 

@@ -2,7 +2,7 @@
 // pool name of the label's name-value list.
 #pragma once
 
-#include "VolumeOther.h"
+#include "Kernel/Implementation/FS/Other/VolumeOther.h"
 
 BRINDLE_OTHER_ENTRY(CEntryZFS)
 

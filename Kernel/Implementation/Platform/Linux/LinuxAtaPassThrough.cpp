@@ -1,7 +1,7 @@
-#include "LinuxAtaPassThrough.h"
+#include "Kernel/Implementation/Platform/Linux/LinuxAtaPassThrough.h"
 
-#include "../../SystemError.h"
-#include "../DeviceControl.h"
+#include "Kernel/Implementation/Common/SystemError.h"
+#include "Kernel/Implementation/Platform/DeviceControl.h"
 
 #include <QByteArray>
 

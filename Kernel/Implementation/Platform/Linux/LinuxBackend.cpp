@@ -1,8 +1,8 @@
-#include "LinuxBackend.h"
+#include "Kernel/Implementation/Platform/Linux/LinuxBackend.h"
 
-#include "LinuxDeviceControl.h"
+#include "Kernel/Implementation/Platform/Linux/LinuxDeviceControl.h"
 
-#include "../../SystemError.h"
+#include "Kernel/Implementation/Common/SystemError.h"
 
 #include <QFile>
 #include <QMutexLocker>

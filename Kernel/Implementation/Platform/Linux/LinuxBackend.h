@@ -2,7 +2,7 @@
 // from ioctls, sysfs, udev and libblkid.
 #pragma once
 
-#include "../PlatformBackend.h"
+#include "Kernel/Implementation/Platform/PlatformBackend.h"
 
 #include <QMutex>
 #include <QString>

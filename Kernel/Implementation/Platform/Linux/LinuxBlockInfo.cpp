@@ -1,4 +1,4 @@
-#include "LinuxBlockInfo.h"
+#include "Kernel/Implementation/Platform/Linux/LinuxBlockInfo.h"
 
 #include <QDir>
 #include <QFile>

@@ -1,13 +1,13 @@
-#include "LinuxDeviceControl.h"
+#include "Kernel/Implementation/Platform/Linux/LinuxDeviceControl.h"
 
-#include "LinuxAtaPassThrough.h"
-#include "LinuxBackend.h"
-#include "LinuxBlockInfo.h"
-#include "LinuxScsiPassThrough.h"
+#include "Kernel/Implementation/Platform/Linux/LinuxAtaPassThrough.h"
+#include "Kernel/Implementation/Platform/Linux/LinuxBackend.h"
+#include "Kernel/Implementation/Platform/Linux/LinuxBlockInfo.h"
+#include "Kernel/Implementation/Platform/Linux/LinuxScsiPassThrough.h"
 
-#include "../../SystemError.h"
-#include "../DeviceControl.h"
-#include "../DriveLayout.h"
+#include "Kernel/Implementation/Common/SystemError.h"
+#include "Kernel/Implementation/Platform/DeviceControl.h"
+#include "Kernel/Implementation/Platform/DriveLayout.h"
 
 #include <QByteArray>
 #include <QFile>

@@ -1,7 +1,7 @@
 // Answers of the device controls (DeviceControl.h) on Linux, from ioctls, sysfs, udev and libblkid.
 #pragma once
 
-#include "../PlatformBackend.h"
+#include "Kernel/Implementation/Platform/PlatformBackend.h"
 
 #include <cstdint>
 

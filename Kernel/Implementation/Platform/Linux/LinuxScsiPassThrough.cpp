@@ -1,7 +1,7 @@
-#include "LinuxScsiPassThrough.h"
+#include "Kernel/Implementation/Platform/Linux/LinuxScsiPassThrough.h"
 
-#include "../../SystemError.h"
-#include "../DeviceControl.h"
+#include "Kernel/Implementation/Common/SystemError.h"
+#include "Kernel/Implementation/Platform/DeviceControl.h"
 
 #include <QByteArray>
 

@@ -1,4 +1,4 @@
-#include "SysfsEnumerate.h"
+#include "Kernel/Implementation/Platform/Linux/SysfsEnumerate.h"
 
 #include <QDir>
 #include <QFile>

@@ -5,7 +5,7 @@
 // database's serial from libudev.
 #pragma once
 
-#include "Kernel/Implementation/RootEnumSource.h"
+#include "Kernel/Implementation/Common/RootEnumSource.h"
 
 #include <QHash>
 #include <QList>

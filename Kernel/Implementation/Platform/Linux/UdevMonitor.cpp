@@ -1,4 +1,4 @@
-#include "UdevMonitor.h"
+#include "Kernel/Implementation/Platform/Linux/UdevMonitor.h"
 
 #include <QDir>
 #include <QFile>

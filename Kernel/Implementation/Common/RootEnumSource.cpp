@@ -1,0 +1,3 @@
+#include "Kernel/Implementation/Common/RootEnumSource.h"
+
+IEnumerationSource::~IEnumerationSource() = default;

@@ -1,3 +1,0 @@
-#include "RootEnumSource.h"
-
-IEnumerationSource::~IEnumerationSource() = default;
