@@ -1,18 +1,11 @@
 #include "Kernel/Implementation/Common/cRoot.h"
 
-#include "Kernel/Implementation/Platform/PlatformBackend.h"
-
 cRoot::cRoot(QObject *parent) : QObject(parent)
 {
     RegisterMetaTypes();
 }
 
 cRoot::~cRoot() = default;
-
-IPlatformBackend &cRoot::Backend()
-{
-    return DefaultPlatformBackend();
-}
 
 void cRoot::EmitDebug(const QString &file, uint32_t line, uint32_t level, const QString &text)
 {

@@ -1,5 +1,6 @@
 #include "Kernel/Implementation/Platform/PlatformBackend.h"
 
+#include "Kernel/Implementation/Common/cRoot.h"
 #include "Kernel/Implementation/Platform/Linux/LinuxBackend.h"
 
 IPlatformBackend::~IPlatformBackend() = default;
@@ -30,4 +31,11 @@ IPlatformBackend &DefaultPlatformBackend()
 {
     static LinuxBackend backend;
     return backend;
+}
+
+// A root's handles use the platform's default back end unless the root gives its own. Defined with
+// the default back end, so the root's interface needs nothing of the platform layer.
+IPlatformBackend &cRoot::Backend()
+{
+    return DefaultPlatformBackend();
 }
