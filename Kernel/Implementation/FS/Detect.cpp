@@ -1,8 +1,8 @@
 #include "Kernel/Implementation/FS/Detect.h"
 
 #include "Kernel/Implementation/Common/cDevice.h"
+#include "Kernel/Implementation/Common/cPartition.h"
 #include "Kernel/Implementation/FS/DetectBytes.h"
-#include "Kernel/Implementation/Partitions/Partition.h"
 
 #include <vector>
 
