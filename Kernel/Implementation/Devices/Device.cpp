@@ -4,13 +4,13 @@
 #include <algorithm>
 #include <cstring>
 
+#include "Kernel/Implementation/Common/cRoot.h"
 #include "Kernel/Implementation/Devices/DeviceImage.h"
 #include "Kernel/Implementation/Devices/DeviceVirtualSource.h"
 #include "Kernel/Implementation/Devices/VolumeCreate.h"
 #include "Kernel/Implementation/FS/Volume.h"
 #include "Kernel/Implementation/Partitions/PartScan.h"
 #include "Kernel/Implementation/Platform/PlatformFile.h"
-#include "Kernel/Implementation/Root/Root.h"
 
 namespace {
 
@@ -19,7 +19,7 @@ constexpr std::uint64_t MaxTransferBytes = 0x40000000ull;
 
 } // namespace
 
-CDevice::CDevice(CRoot *root, const DeviceInfo &info, CImageHandle *image, cStorage *raid)
+CDevice::CDevice(cRoot *root, const DeviceInfo &info, CImageHandle *image, cStorage *raid)
     : m_root(root), m_info(info), m_image(image), m_raid(raid)
 {
     m_partMan = std::make_unique<CPartMan>(this);
@@ -48,7 +48,7 @@ CDevice::~CDevice()
 void CDevice::Internal(const QString &text) const
 {
     if (m_root)
-        static_cast<cRoot *>(m_root)->EmitInternal(text);
+        m_root->EmitInternal(text);
 }
 
 void CDevice::ScanPartitionTables()

@@ -17,7 +17,7 @@
 #include "Kernel/Implementation/Devices/DeviceByteAccess.h"
 #include "Kernel/Implementation/Partitions/Partition.h"
 
-class CRoot;
+class cRoot;
 class CImageHandle;
 namespace Ata {
 struct Command;
@@ -43,7 +43,7 @@ class CDevice : public cDevice
 public:
     // The device takes ownership of `image` and `raid` (either may be null) and of the
     // descriptor's platform handle.
-    CDevice(CRoot *root, const DeviceInfo &info, CImageHandle *image = nullptr, cStorage *raid = nullptr);
+    CDevice(cRoot *root, const DeviceInfo &info, CImageHandle *image = nullptr, cStorage *raid = nullptr);
     ~CDevice() override;
 
     // cStorage
@@ -89,7 +89,7 @@ public:
 
     // The rest of the device's state, for the kernel root, the partition scan and the
     // image and RAID layers.
-    CRoot *GetRoot() const { return m_root; }
+    cRoot *GetRoot() const { return m_root; }
     const DeviceInfo &GetDescriptor() const { return m_info; }
     CPlatformFile *GetHandle() const { return m_info.handle; }
     CImageHandle *GetImageHandle() const { return m_image; }
@@ -158,7 +158,7 @@ private:
     void ReadIdentityStrings();
     void Internal(const QString &text) const;
 
-    CRoot *m_root = nullptr;
+    cRoot *m_root = nullptr;
     std::uint8_t m_announced = 0;
     std::uint64_t m_userValue = 0xFFFFFFFFFFFFFFFFull;
     DeviceInfo m_info;

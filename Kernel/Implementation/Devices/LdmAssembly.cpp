@@ -371,7 +371,7 @@ std::vector<std::unique_ptr<Volume>> Assemble(const Database &db, const QList<Di
     return out;
 }
 
-CDevice *MakeDevice(CRoot *root, std::unique_ptr<Volume> volume, std::uint16_t number)
+CDevice *MakeDevice(cRoot *root, std::unique_ptr<Volume> volume, std::uint16_t number)
 {
     if (!volume || !volume->storage)
         return nullptr;
@@ -397,7 +397,7 @@ CDevice *MakeDevice(CRoot *root, std::unique_ptr<Volume> volume, std::uint16_t n
     return device;
 }
 
-QList<CDevice *> AssembleDevices(CRoot *root, const QList<CDevice *> &devices, std::uint16_t firstNumber,
+QList<CDevice *> AssembleDevices(cRoot *root, const QList<CDevice *> &devices, std::uint16_t firstNumber,
                                  const std::function<void(const QString &)> &message,
                                  const std::function<bool(std::uint16_t number)> &listed)
 {

@@ -17,7 +17,7 @@
 #include "Kernel/Implementation/Partitions/LdmReader.h"
 
 class CDevice;
-class CRoot;
+class cRoot;
 
 namespace LdmAssembly {
 
@@ -88,14 +88,14 @@ std::vector<std::unique_ptr<Volume>> Assemble(const Database &database, const QL
 // A read-only virtual device (media type 7, partition style 6) over an assembled volume; the device
 // owns the volume and lists the disks it reads through as its members. `number` is the device
 // number to give it.
-CDevice *MakeDevice(CRoot *root, std::unique_ptr<Volume> volume, std::uint16_t number);
+CDevice *MakeDevice(cRoot *root, std::unique_ptr<Volume> volume, std::uint16_t number);
 
 // Reads the database of every device that holds a logical-disk-manager metadata area, groups the
 // disks by disk group and assembles the volumes of each group as virtual devices numbered from
 // `firstNumber` in group and record order. A volume whose number `listed` answers true for is
 // already a device and is not made again (its number stays taken). The devices are not yet added
 // to the root; the caller adds them.
-QList<CDevice *> AssembleDevices(CRoot *root, const QList<CDevice *> &devices, std::uint16_t firstNumber,
+QList<CDevice *> AssembleDevices(cRoot *root, const QList<CDevice *> &devices, std::uint16_t firstNumber,
                                  const std::function<void(const QString &)> &message,
                                  const std::function<bool(std::uint16_t number)> &listed = {});
 

@@ -5,7 +5,7 @@
 
 namespace RaidDevice {
 
-CDevice *Make(CRoot *root, std::unique_ptr<CRaidHandle> handle, std::uint16_t number, const QString &model)
+CDevice *Make(cRoot *root, std::unique_ptr<CRaidHandle> handle, std::uint16_t number, const QString &model)
 {
     if (!handle || !handle->IsValid())
         return nullptr;

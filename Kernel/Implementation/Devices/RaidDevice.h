@@ -9,14 +9,14 @@
 
 class CDevice;
 class CRaidHandle;
-class CRoot;
+class cRoot;
 
 namespace RaidDevice {
 
 // The device over `handle` (the device takes ownership), numbered `number` and named `model`
 // (the handle's display name when empty). Null, with the handle destroyed, when the assembly is not
 // valid or its sector size is not one a device can have.
-CDevice *Make(CRoot *root, std::unique_ptr<CRaidHandle> handle, std::uint16_t number,
+CDevice *Make(cRoot *root, std::unique_ptr<CRaidHandle> handle, std::uint16_t number,
               const QString &model = {});
 
 } // namespace RaidDevice
