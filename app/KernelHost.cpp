@@ -17,6 +17,7 @@
 #include "ClientFramework/Views/MainView.h"
 #include "Kernel/Implementation/Devices/Device.h"
 #include "Kernel/Implementation/Images/ImageHandle.h"
+#include "Kernel/Implementation/Report/HardwareInfo.h"
 #include "Kernel/Implementation/Root/ImageOpen.h"
 #include "Kernel/Implementation/Root/Root.h"
 #include "hexeditor/Commander.h"
@@ -71,7 +72,8 @@ bool KernelHost::saveHardwareInfo(const QString &fileName)
         m_root.RefreshAndWait(false);
     const QString application =
         QStringLiteral("%1 %2").arg(Framework::Identity::FullName, Framework::Identity::FileVersion);
-    if (!m_root.WriteHardwareInfo(fileName, QString(), application, log.lines())) {
+    std::uint32_t error = 0;
+    if (!HardwareInfo::Write(m_root, fileName, QString(), application, log.lines(), error)) {
         log.add(tr("Unable to save hardware information to '%1'").arg(QDir::toNativeSeparators(fileName)),
                 Framework::LogEntry::Error);
         return false;

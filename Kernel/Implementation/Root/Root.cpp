@@ -5,7 +5,6 @@
 #include "Kernel/Implementation/Devices/LdmAssembly.h"
 #include "Kernel/Implementation/Platform/PlatformFile.h"
 #include "Kernel/Implementation/Platform/PlatformOps.h"
-#include "Kernel/Implementation/Report/HardwareInfo.h"
 #include "Kernel/Implementation/Root/RootEnumerate.h"
 #include "Kernel/Implementation/Root/ThreadInit.h"
 
@@ -163,13 +162,6 @@ bool CRoot::AddImageDevice(CDevice *device)
 bool CRoot::RemoveDevice(CDevice *device)
 {
     return TakeDevice(device);
-}
-
-bool CRoot::WriteHardwareInfo(const QString &target, const QString &stylesheet, const QString &application,
-                              const QStringList &logLines)
-{
-    uint32_t error = 0;
-    return HardwareInfo::Write(*this, target, stylesheet, application, logLines, error);
 }
 
 uint64_t CRoot::SortKey(uint16_t number, EnumSource source, uint8_t sub, uint32_t mediaType, uint32_t rank)

@@ -72,10 +72,6 @@ public:
     // announcement has been delivered. False when it is not listed.
     virtual bool RemoveDevice(CDevice *device);
 
-    // The hardware-information report.
-    virtual bool WriteHardwareInfo(const QString &target, const QString &stylesheet,
-                                   const QString &application, const QStringList &logLines);
-
     // Storage event emission with the announced-flag and category rules.
     virtual void StorageEvent(CDevice *device, uint32_t code, uint8_t flag = 0);
     // Whether the device has been announced (event 1 went out and event 4 not yet).
