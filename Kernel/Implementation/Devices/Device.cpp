@@ -7,9 +7,9 @@
 #include "Kernel/Implementation/Common/cRoot.h"
 #include "Kernel/Implementation/Devices/DeviceImage.h"
 #include "Kernel/Implementation/Devices/DeviceVirtualSource.h"
+#include "Kernel/Implementation/Devices/PartScanDevice.h"
 #include "Kernel/Implementation/Devices/VolumeCreate.h"
 #include "Kernel/Implementation/FS/Volume.h"
-#include "Kernel/Implementation/Partitions/PartScan.h"
 #include "Kernel/Implementation/Platform/PlatformFile.h"
 
 namespace {

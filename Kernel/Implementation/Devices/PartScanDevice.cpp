@@ -1,5 +1,4 @@
-// The device's side of the scan: its sectors, its descriptor, and the root's signals.
-#include "Kernel/Implementation/Partitions/PartScan.h"
+#include "Kernel/Implementation/Devices/PartScanDevice.h"
 
 #include "Kernel/Implementation/Common/cRoot.h"
 #include "Kernel/Implementation/Devices/Device.h"

@@ -17,8 +17,6 @@
 #include "Kernel/Implementation/Partitions/Partition.h"
 
 class cDevice;
-class cRoot;
-class CDevice;
 
 namespace PartScan {
 
@@ -56,10 +54,5 @@ struct Result
 
 // Runs the whole scan over `input`.
 Result Scan(const Input &input);
-
-// The device's scan at construction: reads through the device, reports through `root`'s internal
-// messages and announces each partition made with storage event 1. The device stores the result's
-// partitions and partition style.
-Result ScanDevice(CDevice &device, const DeviceInfo &descriptor, cRoot *root);
 
 } // namespace PartScan
