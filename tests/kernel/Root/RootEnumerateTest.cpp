@@ -274,8 +274,9 @@ TEST(RootEnumerate, AssembledDevicesAreOpenedOnlyForReading)
         DeviceInfo info;
         ASSERT_TRUE(f.Identify(c, info));
         EXPECT_EQ(info.ready, 1);
-        EXPECT_EQ(f.backend.CallCount("open rw"), r.readOnly ? 0 : 1);
-        EXPECT_EQ(f.backend.CallCount("open ro"), r.readOnly ? 1 : 0);
+        // Identification only reads: a loop device too is opened for reading only.
+        EXPECT_EQ(f.backend.CallCount("open rw"), 0);
+        EXPECT_EQ(f.backend.CallCount("open ro"), 1);
         // What it is built from travels with the descriptor.
         EXPECT_EQ(info.stack.kind, r.kind);
         EXPECT_EQ(info.stack.members, c.stack.members);
