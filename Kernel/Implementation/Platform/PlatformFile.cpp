@@ -147,16 +147,22 @@ bool CPlatformFile::EnsureWriteAccess()
         if (carry)
             backend.SetPosition(h, int64_t(position), SeekOrigin::Begin, reached, error);
     }
-    m_handle = h;
-    m_writeOpen = true;
     m_positionPending = false;
+    Adopt(h, true);
+    return true;
+}
+
+void CPlatformFile::Adopt(PlatformHandle handle, bool writeOpen)
+{
+    m_handle = handle;
+    m_writeOpen = writeOpen;
+    // A volume is read and written to its last sector, past what its file system covers.
     if (m_kind == PlatformKind::Volume) {
         uint32_t returned = 0, ignored = 0;
-        backend.DeviceControl(h, DeviceControl::FSCTL_ALLOW_EXTENDED_DASD_IO, nullptr, 0, nullptr, 0,
-                              returned, ignored);
+        Backend().DeviceControl(handle, DeviceControl::FSCTL_ALLOW_EXTENDED_DASD_IO, nullptr, 0, nullptr, 0,
+                                returned, ignored);
     }
     Debug(__LINE__, 2, QStringLiteral("Open: ") + m_name);
-    return true;
 }
 
 QString CPlatformFile::GetName()
@@ -257,14 +263,7 @@ bool CPlatformFile::Reopen(bool report)
             Record(PlatformOperation::CreateFileOpen, 0, 0, error);
         return false;
     }
-    m_handle = h;
-    m_writeOpen = false;
-    if (m_kind == PlatformKind::Volume) {
-        uint32_t returned = 0, ignored = 0;
-        backend.DeviceControl(h, DeviceControl::FSCTL_ALLOW_EXTENDED_DASD_IO, nullptr, 0, nullptr, 0,
-                              returned, ignored);
-    }
-    Debug(__LINE__, 2, QStringLiteral("Open: ") + m_name);
+    Adopt(h, false);
     return true;
 }
 

@@ -132,6 +132,8 @@ protected:
     uint32_t m_lost = 0;
 
 private:
+    // Takes an open handle as the handle of this file (opened for writing or for reading only).
+    void Adopt(PlatformHandle handle, bool writeOpen);
     // Where the handle stands after the last transfer when the back end transfers without moving it;
     // the handle is moved there before anything reads or uses its position.
     uint64_t m_position = 0;
