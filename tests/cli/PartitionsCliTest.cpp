@@ -15,29 +15,7 @@
 
 namespace {
 
-// Attaches an image file to a free loop device and detaches it again.
-class LoopDevice
-{
-public:
-    explicit LoopDevice(const QString &image, int sectorSize = 512)
-    {
-        TestUtil::ToolResult r =
-            TestUtil::run("losetup", {"-b", QString::number(sectorSize), "-f", "--show", image});
-        if (r.exitCode == 0)
-            m_path = QString::fromUtf8(r.out).trimmed();
-    }
-    ~LoopDevice()
-    {
-        if (!m_path.isEmpty())
-            TestUtil::run("losetup", {"-d", m_path});
-    }
-    LoopDevice(const LoopDevice &) = delete;
-    LoopDevice &operator=(const LoopDevice &) = delete;
-    const QString &path() const { return m_path; }
-
-private:
-    QString m_path;
-};
+using TestUtil::LoopDevice;
 
 using Row = std::tuple<qint64, qint64, bool>; // start, length, unallocated
 
@@ -125,8 +103,8 @@ TEST_F(PartitionsCli, BootRecordDiskMatchesMmls)
         "label: dos\nstart=2048,size=8192,type=83,bootable\nstart=12288,size=100000,type=5\n"
         "start=14336,size=8192,type=83\nstart=24576,size=16384,type=82\nstart=43008,size=4096,type=b\n"));
     LoopDevice loop(image);
-    ASSERT_FALSE(loop.path().isEmpty());
-    QJsonObject doc = list(loop.path());
+    ASSERT_FALSE(loop.Device().isEmpty());
+    QJsonObject doc = list(loop.Device());
     EXPECT_EQ(doc["partStyle"].toInteger(), 2);
     EXPECT_EQ(doc["sectorSize"].toInteger(), 512);
     EXPECT_EQ(doc["totalSectors"].toInteger(), 131072);
@@ -149,12 +127,12 @@ TEST_F(PartitionsCli, BootRecordDiskMatchesMmls)
 
 TEST_F(PartitionsCli, FourKilobyteSectorsCountInDeviceSectors)
 {
-    LoopDevice loop(image, 4096);
-    ASSERT_FALSE(loop.path().isEmpty());
+    LoopDevice loop(image, {"-b", "4096"});
+    ASSERT_FALSE(loop.Device().isEmpty());
     ASSERT_TRUE(sfdisk("label: dos\nstart=256,size=2048,type=83\nstart=4096,size=4096,type=5\n"
                        "start=4352,size=1024,type=83\n",
-                       loop.path()));
-    QJsonObject doc = list(loop.path());
+                       loop.Device()));
+    QJsonObject doc = list(loop.Device());
     EXPECT_EQ(doc["sectorSize"].toInteger(), 4096);
     EXPECT_EQ(doc["totalSectors"].toInteger(), 16384);
     EXPECT_EQ(listing(doc), mmls(image, {"-b", "4096"}));
@@ -168,8 +146,8 @@ TEST_F(PartitionsCli, GptDiskMatchesMmlsAndSgdisk)
             .exitCode,
         0);
     LoopDevice loop(image);
-    ASSERT_FALSE(loop.path().isEmpty());
-    QJsonObject doc = list(loop.path());
+    ASSERT_FALSE(loop.Device().isEmpty());
+    QJsonObject doc = list(loop.Device());
     EXPECT_EQ(doc["partStyle"].toInteger(), 3);
     EXPECT_EQ(listing(doc), mmls(image));
     const QString info = QString::fromUtf8(TestUtil::run("sgdisk", {"-i", "1", image}).out);
@@ -203,8 +181,8 @@ TEST_F(PartitionsCli, LoopingExtendedChainIsListedWithItsMessage)
     ASSERT_EQ(f.write(link), 16);
     f.close();
     LoopDevice loop(image);
-    ASSERT_FALSE(loop.path().isEmpty());
-    QJsonObject doc = list(loop.path());
+    ASSERT_FALSE(loop.Device().isEmpty());
+    QJsonObject doc = list(loop.Device());
     // The chain ends at the record already visited, reported once; the two logical partitions stay.
     const QJsonArray messages = doc["messages"].toArray();
     const QString loopMessage =

@@ -15,28 +15,26 @@
 
 namespace {
 
-QByteArray randomBytes(int size, unsigned seed)
+// An image file of noise and the command line program that writes to it.
+class CliWrite : public ::testing::Test
 {
-    QByteArray b(size, Qt::Uninitialized);
-    std::uint32_t x = seed;
-    for (auto &c : b) {
-        x = x * 1103515245u + 12345u;
-        c = char(x >> 16);
+protected:
+    void makeImage(int size, unsigned seed)
+    {
+        original = TestUtil::randomBytes(size, seed);
+        ASSERT_TRUE(TestUtil::writeFile(image, original));
     }
-    // No boot-record signature: the image is a plain table-less disk.
-    b[510] = b[511] = 0;
-    return b;
-}
+    QTemporaryDir dir;
+    const QString image = dir.filePath("disk.img");
+    QByteArray original;
+    const QString cli = TestUtil::builtProgram("brindle-cli");
+};
 
 } // namespace
 
-TEST(CliWrite, RefusesWithoutYesAndOnBadInput)
+TEST_F(CliWrite, RefusesWithoutYesAndOnBadInput)
 {
-    QTemporaryDir dir;
-    const QString image = dir.filePath("disk.img");
-    const QByteArray original = randomBytes(64 * 1024, 3);
-    ASSERT_TRUE(TestUtil::writeFile(image, original));
-    const QString cli = TestUtil::builtProgram("brindle-cli");
+    ASSERT_NO_FATAL_FAILURE(makeImage(64 * 1024, 3));
 
     const TestUtil::ToolResult noYes =
         TestUtil::run(cli, {"write", image, "--offset", "10", "--hex", "AABB"});
@@ -52,13 +50,9 @@ TEST(CliWrite, RefusesWithoutYesAndOnBadInput)
     EXPECT_EQ(TestUtil::readFile(image), original);
 }
 
-TEST(CliWrite, WritesExactlyTheGivenBytes)
+TEST_F(CliWrite, WritesExactlyTheGivenBytes)
 {
-    QTemporaryDir dir;
-    const QString image = dir.filePath("disk.img");
-    const QByteArray original = randomBytes(1024 * 1024, 5);
-    ASSERT_TRUE(TestUtil::writeFile(image, original));
-    const QString cli = TestUtil::builtProgram("brindle-cli");
+    ASSERT_NO_FATAL_FAILURE(makeImage(1024 * 1024, 5));
 
     const TestUtil::ToolResult hex =
         TestUtil::run(cli, {"write", image, "--offset", "0x1FE", "--hex", "de ad be ef", "--yes"});
@@ -67,7 +61,7 @@ TEST(CliWrite, WritesExactlyTheGivenBytes)
     expected.replace(0x1FE, 4, QByteArray("\xde\xad\xbe\xef", 4));
     EXPECT_EQ(TestUtil::readFile(image), expected);
 
-    const QByteArray block = randomBytes(5000, 9);
+    const QByteArray block = TestUtil::randomBytes(5000, 9);
     ASSERT_TRUE(TestUtil::writeFile(dir.filePath("block.bin"), block));
     const TestUtil::ToolResult file = TestUtil::run(
         cli, {"write", image, "--offset", "3333", "--file", dir.filePath("block.bin"), "--yes"});
@@ -85,7 +79,7 @@ TEST(CliWrite, WritesExactlyTheGivenBytes)
 
 // The write is done when it is on the medium: a failed flush, or a medium the system will not open
 // for writing, makes the command fail; the image is opened for writing once, only to write.
-TEST(CliWrite, FailedFlushOrRefusedWriteOpenFailsTheCommand)
+TEST_F(CliWrite, FailedFlushOrRefusedWriteOpenFailsTheCommand)
 {
     struct Case
     {
@@ -102,8 +96,7 @@ TEST(CliWrite, FailedFlushOrRefusedWriteOpenFailsTheCommand)
     };
     for (const Case &c : cases) {
         ScriptedBackend backend;
-        const QByteArray original = randomBytes(64 * 1024, 7);
-        backend.AddFile("/img/disk.img", original);
+        backend.AddFile("/img/disk.img", TestUtil::randomBytes(64 * 1024, 7));
         if (c.writeOpenError)
             backend.SetWriteOpenError("/img/disk.img", c.writeOpenError);
         if (c.flushError)

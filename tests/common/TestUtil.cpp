@@ -5,6 +5,7 @@
 #include <QProcess>
 #include <QStandardPaths>
 
+#include <cstdint>
 #include <unistd.h>
 
 namespace TestUtil {
@@ -53,6 +54,19 @@ QByteArray readFile(const QString &path)
     if (!f.open(QIODevice::ReadOnly))
         return {};
     return f.readAll();
+}
+
+QByteArray randomBytes(int size, unsigned seed)
+{
+    QByteArray b(size, Qt::Uninitialized);
+    std::uint32_t x = seed;
+    for (auto &c : b) {
+        x = x * 1103515245u + 12345u;
+        c = char(x >> 16);
+    }
+    if (size >= 512)
+        b[510] = b[511] = 0;
+    return b;
 }
 
 QString builtProgram(const QString &name)

@@ -27,6 +27,10 @@ bool canAttachLoop();
 bool writeFile(const QString &path, const QByteArray &data);
 QByteArray readFile(const QString &path);
 
+// SIZE bytes of noise from SEED, without a boot-record signature (bytes 510 and 511 are zero), so
+// a partition scan finds no table in an image made of them.
+QByteArray randomBytes(int size, unsigned seed);
+
 // Path of a built program (brindle, brindle-cli) in the build tree.
 QString builtProgram(const QString &name);
 

@@ -161,53 +161,47 @@ TEST(TemplateValues, WindowsAndUnixTimes)
 
 TEST(TemplateValues, Validators)
 {
-    int pos = 0;
     T::HexPatternValidator pattern(2);
-    QString text = "ab0";
-    pos = 3;
-    EXPECT_EQ(pattern.validate(text, pos), QValidator::Intermediate);
-    EXPECT_EQ(text, "AB 0");
-    text = "ab01";
-    EXPECT_EQ(pattern.validate(text, pos), QValidator::Acceptable);
-    EXPECT_EQ(text, "AB 01");
-    text = "ab0102";
-    EXPECT_EQ(pattern.validate(text, pos), QValidator::Invalid);
-    text = "xy";
-    EXPECT_EQ(pattern.validate(text, pos), QValidator::Invalid);
-
     T::HexDosTimeValidator dos(false);
-    text = "2024-03-15 13:45:58";
-    EXPECT_EQ(dos.validate(text, pos), QValidator::Acceptable);
-    text = "2024-03-15 13:45:59";
-    EXPECT_EQ(dos.validate(text, pos), QValidator::Invalid);
-    text = "2108-03-15 13:45:00";
-    EXPECT_EQ(dos.validate(text, pos), QValidator::Invalid);
-    text = "1979-03-15 13:45:00";
-    EXPECT_EQ(dos.validate(text, pos), QValidator::Intermediate);
-    text = "2024-  -15 13:45:00";
-    EXPECT_EQ(dos.validate(text, pos), QValidator::Intermediate);
-
     T::HexDosFileNameValidator shortName(8);
     T::HexLongFileNameValidator longName(8);
     T::HexExFatFileNameValidator exfat(8);
-    text = "";
-    EXPECT_EQ(shortName.validate(text, pos), QValidator::Intermediate);
-    EXPECT_EQ(longName.validate(text, pos), QValidator::Acceptable);
-    text = "A B";
-    EXPECT_EQ(shortName.validate(text, pos), QValidator::Invalid);
-    EXPECT_EQ(longName.validate(text, pos), QValidator::Acceptable);
-    text = "A:B";
-    EXPECT_EQ(exfat.validate(text, pos), QValidator::Invalid);
-    text = "toolongname";
-    EXPECT_EQ(shortName.validate(text, pos), QValidator::Invalid);
-
     T::HexUInt64Validator number(0, 255);
-    text = "0x1F";
-    EXPECT_EQ(number.validate(text, pos), QValidator::Acceptable);
-    text = "256";
-    EXPECT_EQ(number.validate(text, pos), QValidator::Invalid);
-    text = "-1";
-    EXPECT_EQ(number.validate(text, pos), QValidator::Invalid);
+    using S = QValidator::State;
+    const struct
+    {
+        const QValidator *validator;
+        QString text;
+        S state;
+        QString shown; // the text as the validator leaves it, where it rewrites it
+    } cases[] = {
+        {&pattern, "ab0", S::Intermediate, "AB 0"},
+        {&pattern, "ab01", S::Acceptable, "AB 01"},
+        {&pattern, "ab0102", S::Invalid, {}},
+        {&pattern, "xy", S::Invalid, {}},
+        {&dos, "2024-03-15 13:45:58", S::Acceptable, {}},
+        {&dos, "2024-03-15 13:45:59", S::Invalid, {}},
+        {&dos, "2108-03-15 13:45:00", S::Invalid, {}},
+        {&dos, "1979-03-15 13:45:00", S::Intermediate, {}},
+        {&dos, "2024-  -15 13:45:00", S::Intermediate, {}},
+        {&shortName, "", S::Intermediate, {}},
+        {&longName, "", S::Acceptable, {}},
+        {&shortName, "A B", S::Invalid, {}},
+        {&longName, "A B", S::Acceptable, {}},
+        {&exfat, "A:B", S::Invalid, {}},
+        {&shortName, "toolongname", S::Invalid, {}},
+        {&number, "0x1F", S::Acceptable, {}},
+        {&number, "256", S::Invalid, {}},
+        {&number, "-1", S::Invalid, {}},
+    };
+    for (const auto &c : cases) {
+        QString text = c.text;
+        int pos = int(text.size());
+        EXPECT_EQ(c.validator->validate(text, pos), c.state) << c.text.toStdString();
+        if (!c.shown.isEmpty()) {
+            EXPECT_EQ(text, c.shown);
+        }
+    }
 }
 
 TEST(TemplateCatalog, KindsAndAutomaticChoice)

@@ -387,7 +387,7 @@ TEST_F(DeviceAtaTest, NativeSizesWithHpaAndDco)
     EXPECT_EQ(acc + hpa + dco, 0u);
 }
 
-TEST_F(DeviceAtaTest, SetHpaRefusesToHideEverything)
+TEST_F(DeviceAtaTest, SetHpaSendsTheNewMaximumAndRefusesToHideEverything)
 {
     drive.identify = identify48(1000);
     drive.nativeMax = 999;
@@ -396,13 +396,7 @@ TEST_F(DeviceAtaTest, SetHpaRefusesToHideEverything)
     EXPECT_FALSE(d->SetHpa(1000));
     EXPECT_FALSE(d->SetHpa(0xFFFFFFFFFFFFFFFFull));
     EXPECT_EQ(drive.count(0x37) + drive.count(0xF9), 0);
-}
 
-TEST_F(DeviceAtaTest, SetHpaSendsTheNewMaximum)
-{
-    drive.identify = identify48(1000);
-    drive.nativeMax = 999;
-    auto d = makeDevice();
     ASSERT_TRUE(d->SetHpa(100));
     ASSERT_EQ(drive.count(0x37), 1);
     const auto &c = drive.commands.back();

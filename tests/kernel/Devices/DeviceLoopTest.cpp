@@ -5,7 +5,6 @@
 #include <QTemporaryDir>
 #include <cstring>
 #include <memory>
-#include <random>
 
 #include "Kernel/Implementation/Devices/Device.h"
 #include "Kernel/Implementation/Platform/PlatformFile.h"
@@ -13,40 +12,6 @@
 #include "tests/common/TestUtil.h"
 
 namespace {
-
-// Attaches an image file to a free loop device and detaches it when it goes out of scope.
-class LoopGuard
-{
-public:
-    LoopGuard(const QString &image, unsigned sectorSize)
-    {
-        auto r = TestUtil::run("losetup", {"-f", "--show", "-b", QString::number(sectorSize), image});
-        if (r.exitCode == 0)
-            m_path = QString::fromUtf8(r.out).trimmed();
-    }
-    ~LoopGuard()
-    {
-        if (!m_path.isEmpty())
-            TestUtil::run("losetup", {"-d", m_path});
-    }
-    LoopGuard(const LoopGuard &) = delete;
-    LoopGuard &operator=(const LoopGuard &) = delete;
-    const QString &path() const { return m_path; }
-
-private:
-    QString m_path;
-};
-
-QByteArray randomBytes(int size, unsigned seed)
-{
-    QByteArray b(size, 0);
-    std::mt19937 rng(seed);
-    for (auto &c : b)
-        c = char(rng());
-    // No boot-record signature, so the partition scan finds nothing to interpret.
-    b[510] = b[511] = 0;
-    return b;
-}
 
 class DeviceLoopTest : public ::testing::TestWithParam<unsigned>
 {
@@ -59,14 +24,14 @@ TEST_P(DeviceLoopTest, ReadBytesEqualsTheImageAtManyOffsets)
     const unsigned ss = GetParam();
     QTemporaryDir dir;
     const QString image = dir.filePath("disk.img");
-    const QByteArray data = randomBytes(int(64 * ss + 0), 11 + ss);
+    const QByteArray data = TestUtil::randomBytes(int(64 * ss + 0), 11 + ss);
     ASSERT_TRUE(TestUtil::writeFile(image, data));
-    LoopGuard loop(image, ss);
-    ASSERT_FALSE(loop.path().isEmpty()) << "losetup failed";
+    TestUtil::LoopDevice loop(image, {"-b", QString::number(ss)});
+    ASSERT_FALSE(loop.Device().isEmpty()) << "losetup failed";
 
     CRoot root;
     DeviceInfo info;
-    info.handle = new CPlatformFile(&root, loop.path(), PlatformKind::Device);
+    info.handle = new CPlatformFile(&root, loop.Device(), PlatformKind::Device);
     info.source = EnumSource::VolumeBacked;
     info.totalSectors = std::uint64_t(data.size()) / ss;
     info.sectorShift = std::uint8_t(ss == 4096 ? 12 : 9);
@@ -109,14 +74,14 @@ TEST_P(DeviceLoopTest, WriteBytesReachesTheImage)
     const unsigned ss = GetParam();
     QTemporaryDir dir;
     const QString image = dir.filePath("disk.img");
-    QByteArray data = randomBytes(int(16 * ss), 5);
+    QByteArray data = TestUtil::randomBytes(int(16 * ss), 5);
     ASSERT_TRUE(TestUtil::writeFile(image, data));
     {
-        LoopGuard loop(image, ss);
-        ASSERT_FALSE(loop.path().isEmpty());
+        TestUtil::LoopDevice loop(image, {"-b", QString::number(ss)});
+        ASSERT_FALSE(loop.Device().isEmpty());
         CRoot root;
         DeviceInfo info;
-        info.handle = new CPlatformFile(&root, loop.path(), PlatformKind::Device);
+        info.handle = new CPlatformFile(&root, loop.Device(), PlatformKind::Device);
         info.totalSectors = 16;
         info.sectorShift = std::uint8_t(ss == 4096 ? 12 : 9);
         info.ready = 1;

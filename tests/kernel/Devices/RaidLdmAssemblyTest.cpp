@@ -7,6 +7,7 @@
 
 #include "Kernel/Implementation/Devices/Device.h"
 #include "Kernel/Implementation/Devices/LdmAssembly.h"
+#include "tests/kernel/Devices/LdmTestDisks.h"
 #include "tests/kernel/Raid/RaidTestStorage.h"
 
 using namespace RaidTest;
@@ -15,28 +16,9 @@ namespace {
 
 constexpr std::uint64_t DataStart = 63;
 
-QByteArray Num(std::uint64_t v)
-{
-    QByteArray digits;
-    while (v) {
-        digits.prepend(char(v & 0xFF));
-        v >>= 8;
-    }
-    return char(digits.size()) + digits;
-}
-
-QByteArray Txt(const QByteArray &t)
-{
-    return char(t.size()) + t;
-}
-
-QByteArray Be64(std::uint64_t v)
-{
-    QByteArray b(8, '\0');
-    for (int i = 7; i >= 0; --i, v >>= 8)
-        b[i] = char(v & 0xFF);
-    return b;
-}
+using LdmTestDisks::Be64;
+using LdmTestDisks::Num;
+using LdmTestDisks::Txt;
 
 Ldm::Record Rec(std::uint8_t type, const QByteArray &body, std::uint8_t flags = 0)
 {

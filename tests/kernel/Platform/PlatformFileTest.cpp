@@ -27,6 +27,13 @@ QByteArray pattern(int size, int seed = 1)
 class PlatformFileTest : public ::testing::Test
 {
 protected:
+    // Locking and unlocking volumes succeed.
+    void AllowLocks()
+    {
+        auto succeed = [](const QByteArray &, QByteArray &, uint32_t &) -> uint32_t { return 0; };
+        backend.SetControlHandler(DeviceControl::FSCTL_LOCK_VOLUME, succeed);
+        backend.SetControlHandler(DeviceControl::FSCTL_UNLOCK_VOLUME, succeed);
+    }
     ScriptedBackend backend;
     TestRoot root{&backend};
 
@@ -180,31 +187,23 @@ TEST_F(PlatformFileTest, VolumeOpenAsksForExtendedAccessAndIgnoresTheAnswer)
     EXPECT_TRUE(volume.Close());
 }
 
-TEST_F(PlatformFileTest, ShortReadFailsWithEndOfFileAndOneRecord)
+TEST_F(PlatformFileTest, ShortTransfersFailWithEndOfFileAndOneRecordEach)
 {
     CPlatformFile disk(&root, "/dev/disk0", PlatformKind::Device);
     backend.ScriptRead(Transfer{0, 100});
     QByteArray buffer(512, '\0');
     EXPECT_FALSE(disk.Read(512, 512, buffer.data()));
     EXPECT_EQ(disk.GetError(), SystemError::HandleEof);
-    ASSERT_EQ(root.platform.size(), 1);
+    EXPECT_EQ(backend.CallCount("read"), 1);
+    backend.ScriptWrite(Transfer{0, 10});
+    EXPECT_FALSE(disk.Write(0, 512, buffer.constData()));
+    ASSERT_EQ(root.platform.size(), 2);
     EXPECT_EQ(root.platform[0].operation, uint32_t(PlatformOperation::ReadFile));
     EXPECT_EQ(root.platform[0].position, 512u);
     EXPECT_EQ(root.platform[0].block, 512u);
     EXPECT_EQ(root.platform[0].error, SystemError::HandleEof);
-    EXPECT_EQ(backend.CallCount("read"), 1);
-    EXPECT_TRUE(disk.Close());
-}
-
-TEST_F(PlatformFileTest, ShortWriteFailsWithEndOfFile)
-{
-    CPlatformFile disk(&root, "/dev/disk0", PlatformKind::Device);
-    backend.ScriptWrite(Transfer{0, 10});
-    const QByteArray data = pattern(512, 9);
-    EXPECT_FALSE(disk.Write(0, 512, data.constData()));
-    ASSERT_EQ(root.platform.size(), 1);
-    EXPECT_EQ(root.platform[0].operation, uint32_t(PlatformOperation::WriteFile));
-    EXPECT_EQ(root.platform[0].error, SystemError::HandleEof);
+    EXPECT_EQ(root.platform[1].operation, uint32_t(PlatformOperation::WriteFile));
+    EXPECT_EQ(root.platform[1].error, SystemError::HandleEof);
     EXPECT_TRUE(disk.Close());
 }
 
@@ -237,12 +236,20 @@ TEST_F(PlatformFileTest, VanishedDeviceBecomesLostSilently)
 
 TEST_F(PlatformFileTest, NotFoundOnDeviceIsLostButOnFileAndVolumeIsAnOrdinaryFailure)
 {
+    // A media change on a device is an ordinary failure: the device is not reopened.
     CPlatformFile disk(&root, "/dev/disk0", PlatformKind::Device);
-    backend.ScriptRead(Transfer{SystemError::FileNotFound, -1});
+    backend.ScriptRead(Transfer{SystemError::MediaChanged, -1});
+    backend.ScriptRead(Transfer{SystemError::MediaChanged, -1});
     QByteArray buffer(512, '\0');
+    EXPECT_FALSE(disk.Read(0, 512, buffer.data()));
+    EXPECT_EQ(backend.CallCount("open"), 1);
+    EXPECT_EQ(root.platform.size(), 1);
+    EXPECT_FALSE(disk.IsLost());
+    backend.ScriptRead(Transfer{SystemError::FileNotFound, -1});
     EXPECT_FALSE(disk.Read(0, 512, buffer.data()));
     EXPECT_TRUE(disk.IsLost());
     EXPECT_TRUE(disk.Close());
+    root.ClearRecords();
 
     CPlatformFile volume(&root, "/dev/vol0", PlatformKind::Volume);
     backend.ScriptRead(Transfer{SystemError::DevNotExist, -1});
@@ -334,18 +341,6 @@ TEST_F(PlatformFileTest, MediaChangeOnVolumeReopensOnceAndReadsTheSamePosition)
     ASSERT_EQ(root.platform.size(), 1);
     EXPECT_EQ(root.platform[0].error, SystemError::MediaChanged);
     EXPECT_TRUE(volume.Close());
-}
-
-TEST_F(PlatformFileTest, MediaChangeOnDeviceIsAnOrdinaryFailure)
-{
-    CPlatformFile disk(&root, "/dev/disk0", PlatformKind::Device);
-    backend.ScriptRead(Transfer{SystemError::MediaChanged, -1});
-    backend.ScriptRead(Transfer{SystemError::MediaChanged, -1});
-    QByteArray buffer(512, '\0');
-    EXPECT_FALSE(disk.Read(0, 512, buffer.data()));
-    EXPECT_EQ(backend.CallCount("open"), 1);
-    EXPECT_EQ(root.platform.size(), 1);
-    EXPECT_TRUE(disk.Close());
 }
 
 TEST_F(PlatformFileTest, FailedPositioningIsRecordedWithPositionAndBlock)
@@ -476,9 +471,7 @@ TEST_F(PlatformFileTest, MisuseByKindAndStateNeverReachesTheSystem)
 
 TEST_F(PlatformFileTest, LockDismountUnlockFollowTheVolumeStates)
 {
-    auto succeed = [](const QByteArray &, QByteArray &, uint32_t &) -> uint32_t { return 0; };
-    backend.SetControlHandler(DeviceControl::FSCTL_LOCK_VOLUME, succeed);
-    backend.SetControlHandler(DeviceControl::FSCTL_UNLOCK_VOLUME, succeed);
+    AllowLocks();
     CPlatformFile volume(&root, "/dev/vol0", PlatformKind::Volume);
     ASSERT_TRUE(volume.Lock());
     EXPECT_TRUE(volume.IsLocked());
@@ -508,9 +501,7 @@ TEST_F(PlatformFileTest, LockDismountUnlockFollowTheVolumeStates)
 
 TEST_F(PlatformFileTest, DestroyingALockedVolumeUnlocksAndClosesIt)
 {
-    auto succeed = [](const QByteArray &, QByteArray &, uint32_t &) -> uint32_t { return 0; };
-    backend.SetControlHandler(DeviceControl::FSCTL_LOCK_VOLUME, succeed);
-    backend.SetControlHandler(DeviceControl::FSCTL_UNLOCK_VOLUME, succeed);
+    AllowLocks();
     {
         CPlatformFile volume(&root, "/dev/vol0", PlatformKind::Volume);
         ASSERT_TRUE(volume.Lock());

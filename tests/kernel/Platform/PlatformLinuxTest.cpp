@@ -24,29 +24,7 @@ namespace {
 
 using namespace DeviceControl;
 
-// A loop device attached to an image for the life of the object.
-class LoopGuard
-{
-public:
-    LoopGuard(const QString &image, const QStringList &options)
-    {
-        const auto r =
-            TestUtil::run("losetup", QStringList{"--find", "--show"} + options + QStringList{image});
-        if (r.exitCode == 0)
-            m_device = QString::fromLocal8Bit(r.out).trimmed();
-    }
-    ~LoopGuard()
-    {
-        if (!m_device.isEmpty())
-            TestUtil::run("losetup", {"-d", m_device});
-    }
-    LoopGuard(const LoopGuard &) = delete;
-    LoopGuard &operator=(const LoopGuard &) = delete;
-    const QString &device() const { return m_device; }
-
-private:
-    QString m_device;
-};
+using TestUtil::LoopDevice;
 
 // Makes the kernel's partitions of a loop device appear (partition scanning is not always done at
 // attach time): partx adds what the table holds.
@@ -194,14 +172,14 @@ protected:
 
 TEST_F(PlatformLoopTest, DeviceReadsEqualDdAndGeometryEqualsBlockdev)
 {
-    LoopGuard loop(image, {});
-    ASSERT_FALSE(loop.device().isEmpty());
+    LoopDevice loop(image);
+    ASSERT_FALSE(loop.Device().isEmpty());
     TestRoot root;
-    CPlatformFile disk(&root, loop.device(), PlatformKind::Device);
+    CPlatformFile disk(&root, loop.Device(), PlatformKind::Device);
     QByteArray buffer(4096, '\0');
     ASSERT_TRUE(disk.Read(3 * 512, 4096, buffer.data()));
     const auto dd =
-        TestUtil::run("dd", {"if=" + loop.device(), "bs=512", "skip=3", "count=8", "status=none"});
+        TestUtil::run("dd", {"if=" + loop.Device(), "bs=512", "skip=3", "count=8", "status=none"});
     ASSERT_EQ(dd.exitCode, 0);
     EXPECT_EQ(buffer, dd.out);
     EXPECT_EQ(buffer, content.mid(1536, 4096));
@@ -211,7 +189,7 @@ TEST_F(PlatformLoopTest, DeviceReadsEqualDdAndGeometryEqualsBlockdev)
     uint32_t returned = 0;
     ASSERT_TRUE(disk.DIOC(IOCTL_DISK_GET_DRIVE_GEOMETRY, nullptr, 0, &g, sizeof g, &returned));
     EXPECT_EQ(returned, 24u);
-    const auto ssz = TestUtil::run("blockdev", {"--getss", loop.device()});
+    const auto ssz = TestUtil::run("blockdev", {"--getss", loop.Device()});
     EXPECT_EQ(g.BytesPerSector, ssz.out.trimmed().toUInt());
     EXPECT_EQ(g.MediaType, FixedMedia);
     EXPECT_EQ(uint64_t(g.Cylinders) * g.TracksPerCylinder * g.SectorsPerTrack * g.BytesPerSector,
@@ -219,7 +197,7 @@ TEST_F(PlatformLoopTest, DeviceReadsEqualDdAndGeometryEqualsBlockdev)
 
     DISK_GEOMETRY_EX gx{};
     ASSERT_TRUE(disk.DIOC(IOCTL_DISK_GET_DRIVE_GEOMETRY_EX, nullptr, 0, &gx, sizeof gx, &returned));
-    const auto size = TestUtil::run("blockdev", {"--getsize64", loop.device()});
+    const auto size = TestUtil::run("blockdev", {"--getsize64", loop.Device()});
     EXPECT_EQ(uint64_t(gx.DiskSize), size.out.trimmed().toULongLong());
     EXPECT_FALSE(disk.DIOC(IOCTL_DISK_GET_DRIVE_GEOMETRY, nullptr, 0, &g, 10, &returned));
     EXPECT_EQ(disk.GetError(), SystemError::InsufficientBuffer);
@@ -230,7 +208,7 @@ TEST_F(PlatformLoopTest, DeviceReadsEqualDdAndGeometryEqualsBlockdev)
     ASSERT_TRUE(disk.DIOC(IOCTL_STORAGE_QUERY_PROPERTY, &query, sizeof query, &alignment, sizeof alignment,
                           &returned));
     EXPECT_EQ(returned, 28u);
-    const auto pbsz = TestUtil::run("blockdev", {"--getpbsz", loop.device()});
+    const auto pbsz = TestUtil::run("blockdev", {"--getpbsz", loop.Device()});
     EXPECT_EQ(alignment.BytesPerPhysicalSector, pbsz.out.trimmed().toUInt());
     EXPECT_EQ(alignment.BytesPerLogicalSector, g.BytesPerSector);
 
@@ -257,10 +235,10 @@ TEST_F(PlatformLoopTest, DeviceReadsEqualDdAndGeometryEqualsBlockdev)
 
 TEST_F(PlatformLoopTest, ReadOnlyLoopIsNotWritable)
 {
-    LoopGuard loop(image, {"-r"});
-    ASSERT_FALSE(loop.device().isEmpty());
+    LoopDevice loop(image, {"-r"});
+    ASSERT_FALSE(loop.Device().isEmpty());
     TestRoot root;
-    CPlatformFile disk(&root, loop.device(), PlatformKind::Device);
+    CPlatformFile disk(&root, loop.Device(), PlatformKind::Device);
     ASSERT_TRUE(disk.Reopen(true));
     EXPECT_FALSE(disk.IsWritable());
     QByteArray buffer(512, '\0');
@@ -269,7 +247,7 @@ TEST_F(PlatformLoopTest, ReadOnlyLoopIsNotWritable)
     EXPECT_TRUE(disk.Close());
 
     // Asking the device itself: the query answers "write protected".
-    CPlatformFile again(&root, loop.device(), PlatformKind::Device);
+    CPlatformFile again(&root, loop.Device(), PlatformKind::Device);
     EXPECT_FALSE(again.DIOC(IOCTL_DISK_IS_WRITABLE, nullptr, 0, nullptr, 0));
     EXPECT_EQ(again.GetError(), SystemError::WriteProtect);
     EXPECT_TRUE(again.Close());
@@ -291,10 +269,10 @@ TEST_F(PlatformLoopTest, LayoutOfPartitionedLoopEqualsSysfs)
     const auto r = TestUtil::run("sh", {"-c", "sfdisk -q '" + image + "' < '" + scriptPath + "'"});
     ASSERT_EQ(r.exitCode, 0) << r.err.toStdString();
 
-    LoopGuard loop(image, {"-P"});
-    ASSERT_FALSE(loop.device().isEmpty());
-    ensurePartitions(loop.device());
-    const QString name = QFileInfo(loop.device()).fileName();
+    LoopDevice loop(image, {"-P"});
+    ASSERT_FALSE(loop.Device().isEmpty());
+    ensurePartitions(loop.Device());
+    const QString name = QFileInfo(loop.Device()).fileName();
 
     // The kernel's partitions, from sysfs, in number order; the extended container is no partition here.
     QMap<int, uint64_t> sysfs;
@@ -314,7 +292,7 @@ TEST_F(PlatformLoopTest, LayoutOfPartitionedLoopEqualsSysfs)
     ASSERT_EQ(sysfs.size(), 4);
 
     TestRoot root;
-    CPlatformFile disk(&root, loop.device(), PlatformKind::Device);
+    CPlatformFile disk(&root, loop.Device(), PlatformKind::Device);
     QList<uint64_t> offsets;
     ASSERT_TRUE(disk.GetLayoutInfo(offsets));
     EXPECT_EQ(offsets, QList<uint64_t>(sysfs.begin(), sysfs.end()));
@@ -352,7 +330,7 @@ TEST_F(PlatformLoopTest, LayoutOfPartitionedLoopEqualsSysfs)
     EXPECT_TRUE(disk.Close());
 
     // A partition answers for itself.
-    CPlatformFile part(&root, loop.device() + "p5", PlatformKind::Volume);
+    CPlatformFile part(&root, loop.Device() + "p5", PlatformKind::Volume);
     PARTITION_INFORMATION_EX info{};
     ASSERT_TRUE(part.DIOC(IOCTL_DISK_GET_PARTITION_INFO_EX, nullptr, 0, &info, sizeof info, &returned));
     EXPECT_EQ(info.PartitionNumber, 5u); // the first logical partition
@@ -372,11 +350,11 @@ TEST_F(PlatformLoopTest, GptLayoutCarriesTypesAndNames)
     const auto r = TestUtil::run("sgdisk", {"-n", "1:2048:+1M", "-t", "1:8300", "-c", "1:alpha", "-n",
                                             "2:6144:+1M", "-t", "2:0700", "-c", "2:beta", image});
     ASSERT_EQ(r.exitCode, 0) << r.err.toStdString();
-    LoopGuard loop(image, {"-P"});
-    ASSERT_FALSE(loop.device().isEmpty());
-    ensurePartitions(loop.device());
+    LoopDevice loop(image, {"-P"});
+    ASSERT_FALSE(loop.Device().isEmpty());
+    ensurePartitions(loop.Device());
     TestRoot root;
-    CPlatformFile disk(&root, loop.device(), PlatformKind::Device);
+    CPlatformFile disk(&root, loop.Device(), PlatformKind::Device);
     QList<uint64_t> offsets;
     ASSERT_TRUE(disk.GetLayoutInfo(offsets));
     EXPECT_EQ(offsets, (QList<uint64_t>{2048 * 512, 6144 * 512}));
@@ -399,13 +377,13 @@ TEST_F(PlatformLoopTest, GptLayoutCarriesTypesAndNames)
 
 TEST_F(PlatformLoopTest, LockIsAnExclusiveOpenAndDismountIsNotSupported)
 {
-    LoopGuard loop(image, {});
-    ASSERT_FALSE(loop.device().isEmpty());
+    LoopDevice loop(image);
+    ASSERT_FALSE(loop.Device().isEmpty());
     TestRoot root;
-    CPlatformFile volume(&root, loop.device(), PlatformKind::Volume);
+    CPlatformFile volume(&root, loop.Device(), PlatformKind::Volume);
     ASSERT_TRUE(volume.Lock());
     // A second exclusive opener is refused while the lock is held.
-    CPlatformFile other(&root, loop.device(), PlatformKind::Volume);
+    CPlatformFile other(&root, loop.Device(), PlatformKind::Volume);
     EXPECT_FALSE(other.Lock());
     EXPECT_EQ(other.GetError(), SystemError::AccessDenied);
     EXPECT_TRUE(other.Close());
@@ -418,10 +396,10 @@ TEST_F(PlatformLoopTest, LockIsAnExclusiveOpenAndDismountIsNotSupported)
 
 TEST_F(PlatformLoopTest, AtaPassThroughOnLoopFailsQuietly)
 {
-    LoopGuard loop(image, {});
-    ASSERT_FALSE(loop.device().isEmpty());
+    LoopDevice loop(image);
+    ASSERT_FALSE(loop.Device().isEmpty());
     TestRoot root;
-    CPlatformFile disk(&root, loop.device(), PlatformKind::Device);
+    CPlatformFile disk(&root, loop.Device(), PlatformKind::Device);
     QByteArray request(48 + 512, '\0');
     ATA_PASS_THROUGH_EX header{};
     header.Length = 48;
