@@ -44,18 +44,27 @@ public:
         ToolResult r = run("losetup", options + QStringList{"-f", "--show", image});
         if (r.exitCode == 0)
             m_device = QString::fromUtf8(r.out).trimmed();
+        else
+            m_error = QString::fromUtf8(r.err);
     }
-    ~LoopDevice()
+    ~LoopDevice() { detach(); }
+    // Detaches now (true when losetup did) and forgets the device: the name may be taken by another
+    // test's loop device at once, which the destructor must then leave alone.
+    bool detach()
     {
-        if (!m_device.isEmpty())
-            run("losetup", {"-d", m_device});
+        const bool ok = !m_device.isEmpty() && run("losetup", {"-d", m_device}).exitCode == 0;
+        m_device.clear();
+        return ok;
     }
     LoopDevice(const LoopDevice &) = delete;
     LoopDevice &operator=(const LoopDevice &) = delete;
     const QString &Device() const { return m_device; }
+    // What losetup said when it could not attach.
+    const QString &Error() const { return m_error; }
 
 private:
     QString m_device;
+    QString m_error;
 };
 
 // What `blockdev OPTION DEVICE` prints as a number (--getsize64, --getss, --getpbsz); -1 on failure.

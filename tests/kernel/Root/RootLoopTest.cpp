@@ -13,36 +13,6 @@
 
 namespace {
 
-// Attaches an image to a free loop device and detaches it when it goes out of scope.
-class LoopGuard
-{
-public:
-    LoopGuard(const QString &image, const QStringList &options)
-    {
-        TestUtil::ToolResult r = TestUtil::run("losetup", options + QStringList{"-f", "--show", image});
-        if (r.exitCode == 0)
-            m_device = QString::fromUtf8(r.out).trimmed();
-        else
-            m_error = QString::fromUtf8(r.err);
-    }
-    ~LoopGuard() { Detach(); }
-    // Detaches now; the guard then owns nothing (the number may go to someone else at once).
-    void Detach()
-    {
-        if (!m_device.isEmpty())
-            TestUtil::run("losetup", {"-d", m_device});
-        m_device.clear();
-    }
-    LoopGuard(const LoopGuard &) = delete;
-    LoopGuard &operator=(const LoopGuard &) = delete;
-    const QString &Device() const { return m_device; }
-    const QString &Error() const { return m_error; }
-
-private:
-    QString m_device;
-    QString m_error;
-};
-
 quint64 Blockdev(const QString &option, const QString &device)
 {
     TestUtil::ToolResult r = TestUtil::run("blockdev", {option, device});
@@ -77,7 +47,7 @@ TEST(RootLoop, LoopDevicesAppearWithBlockdevSizes)
         ASSERT_TRUE(p.waitForFinished());
         ASSERT_EQ(p.exitCode(), 0) << p.readAllStandardError().toStdString();
     }
-    LoopGuard mbr(mbrImage, {"-P"});
+    TestUtil::LoopDevice mbr(mbrImage, {"-P"});
     ASSERT_FALSE(mbr.Device().isEmpty()) << mbr.Error().toStdString();
     // Some kernels leave the partition scan of a new loop device to user space.
     const QString firstPartition = "/sys/class/block/" + mbr.Device().mid(5) + "p1";
@@ -88,7 +58,7 @@ TEST(RootLoop, LoopDevicesAppearWithBlockdevSizes)
     // A 16 MiB disk of 4096-byte sectors.
     const QString bigImage = dir.filePath("4k.img");
     ASSERT_TRUE(MakeImage(bigImage, 16 << 20));
-    LoopGuard big(bigImage, {"-b", "4096"});
+    TestUtil::LoopDevice big(bigImage, {"-b", "4096"});
     ASSERT_FALSE(big.Device().isEmpty()) << big.Error().toStdString();
 
     CRoot root;
@@ -96,7 +66,7 @@ TEST(RootLoop, LoopDevicesAppearWithBlockdevSizes)
     QObject::connect(&root, &cRoot::kernelInternal, [&](const _event_internal &e) { internal << e.text; });
     ASSERT_TRUE(root.RefreshAndWait());
 
-    for (const LoopGuard *loop : {&mbr, &big}) {
+    for (const TestUtil::LoopDevice *loop : {&mbr, &big}) {
         SCOPED_TRACE(loop->Device().toStdString());
         CDevice *d = root.FindDeviceByPath(loop->Device());
         ASSERT_NE(d, nullptr) << "internal messages: " << internal.join("; ").toStdString();
@@ -128,7 +98,7 @@ TEST(RootLoop, LoopDevicesAppearWithBlockdevSizes)
 
     // Detached: the next refresh removes the device (another test may already reuse its number, so
     // it is looked for by its image).
-    big.Detach();
+    big.detach();
     ASSERT_TRUE(root.RefreshAndWait());
     bool stillThere = false;
     for (CDevice *d : root.Devices())
@@ -150,7 +120,7 @@ TEST(RootLoop, FileSystemOnTheWholeDeviceIsItsVolume)
     TestUtil::ToolResult mk =
         TestUtil::run("mke2fs", {"-q", "-F", "-t", "ext4", "-L", "BRINDLE_T", "-U", uuid, image, "8M"});
     ASSERT_EQ(mk.exitCode, 0) << mk.err.toStdString();
-    LoopGuard loop(image, {});
+    TestUtil::LoopDevice loop(image, {});
     ASSERT_FALSE(loop.Device().isEmpty()) << loop.Error().toStdString();
 
     CRoot root;
