@@ -402,7 +402,8 @@ QList<SaveFailure> Storage::save()
         return failures;
     }
     QList<std::uint64_t> written;
-    for (const std::uint64_t n : sectors) {
+    for (std::size_t i = 0; i < sectors.size(); ++i) {
+        const std::uint64_t n = sectors[i];
         CachedSector *s = m_cache->find(n);
         std::uint32_t error = 0;
         if (m_active->WriteSectors(n, 1, s->data.constData(), error)) {
@@ -410,9 +411,8 @@ QList<SaveFailure> Storage::save()
         } else if (error == SystemError::AccessDenied || error == SystemError::WriteProtect) {
             // The medium cannot be opened for writing: no other sector would fare better.
             const QString message = writeRefusedText(error);
-            for (const std::uint64_t m : sectors)
-                if (!written.contains(m))
-                    failures.append({m, error, message});
+            for (std::size_t j = i; j < sectors.size(); ++j)
+                failures.append({sectors[j], error, message});
             emit writeFailed(message);
             break;
         } else {
