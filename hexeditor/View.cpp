@@ -259,7 +259,7 @@ void View::buildCustomizeMenu()
             a->setData(value);
             group->addAction(a);
             into.insert(value, a);
-            connect(a, &QAction::toggled, this, [this, apply, value](bool on) {
+            connect(a, &QAction::toggled, this, [this, apply, value = value](bool on) {
                 if (on && m_menuLock.available() > 0)
                     apply(value);
             });
