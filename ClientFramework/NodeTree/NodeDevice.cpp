@@ -92,16 +92,20 @@ void NodeDevice::refreshState()
 
 void NodeDevice::rebuild()
 {
-    // The kernel objects the children stand for: the partitions, or the whole-device volume.
+    // The kernel objects the children stand for: the partitions (with their index in the kernel's
+    // list), or the whole-device volume.
+    QList<QPair<CPartition *, int>> partitions;
+    CVolume *whole = nullptr;
     QList<const cStorage *> wanted;
     if (m_device && isReady()) {
         const std::uint32_t count = m_device->GetPartitionCount();
         for (std::uint32_t i = 0; i < count; ++i)
-            if (CPartition *p = m_device->GetPartition(i))
+            if (CPartition *p = m_device->GetPartition(i)) {
+                partitions.append({p, int(i)});
                 wanted.append(p);
-        if (count == 0)
-            if (CVolume *v = VolumeSource::volumeOf(m_device))
-                wanted.append(v);
+            }
+        if (count == 0 && (whole = VolumeSource::volumeOf(m_device)))
+            wanted.append(whole);
     }
     // The same objects keep their nodes, and with them whatever shows or selects those nodes.
     QList<const cStorage *> held;
@@ -111,12 +115,10 @@ void NodeDevice::rebuild()
     if (isPopulated() && held == wanted)
         return;
     clearChildren();
-    for (int i = 0; i < wanted.size(); ++i) {
-        if (wanted.size() == 1 && m_device->GetPartitionCount() == 0)
-            appendChild(new NodeDrive(VolumeSource::volumeOf(m_device), this));
-        else
-            appendChild(new NodePartition(m_device->GetPartition(std::uint32_t(i)), i, this));
-    }
+    for (const auto &[partition, index] : partitions)
+        appendChild(new NodePartition(partition, index, this));
+    if (whole)
+        appendChild(new NodeDrive(whole, this));
     setFlags(NodeState::Populated, m_device && isReady());
 }
 
