@@ -28,6 +28,7 @@
 #include <QLibraryInfo>
 
 #include <memory>
+#include <optional>
 
 namespace Solution {
 
@@ -158,6 +159,10 @@ int Startup::run(const QStringList &argumentList, int &argc, char **argv)
         // command line runs (a request enumerates again when it needs a fresh list).
         root->RefreshAndWait(false, RefreshKinds(), 30000);
         mainView->show();
+        // A terminate request from here on ends the run in order (it is served once the loop runs).
+        std::optional<Framework::QuitOnSignal> quitOnSignal;
+        if (m_options.runEventLoop)
+            quitOnSignal.emplace();
         application->initializationCompleted();
 
         log.add(
@@ -166,10 +171,8 @@ int Startup::run(const QStringList &argumentList, int &argc, char **argv)
         logVersion(!root ? tr("pending...") : kernelVersion.isEmpty() ? tr("Undefined") : kernelVersion);
 
         int code = 0;
-        if (m_options.runEventLoop) {
-            Framework::QuitOnSignal quitOnSignal;
+        if (m_options.runEventLoop)
             QApplication::exec();
-        }
         code = application->exitCode();
         if (code != 0)
             log.add(tr("Exiting with error code: %1").arg(code));
